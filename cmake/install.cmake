@@ -1,0 +1,27 @@
+# Installs headers, libraries, the CMake package jsonvalue (target jsonvalue::jsonvalue) and
+# the pkg-config file jsonvalue.pc.
+include(CMakePackageConfigHelpers)
+
+set(JSONVALUE_CMAKE_DIR ${CMAKE_INSTALL_LIBDIR}/cmake/jsonvalue)
+
+install(DIRECTORY include/json TYPE INCLUDE)
+install(TARGETS jsonvalue jsonvalue_number_text
+  EXPORT jsonvalueTargets
+  LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
+  INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
+install(EXPORT jsonvalueTargets NAMESPACE jsonvalue:: DESTINATION ${JSONVALUE_CMAKE_DIR})
+
+configure_package_config_file(cmake/jsonvalueConfig.cmake.in
+  ${CMAKE_CURRENT_BINARY_DIR}/jsonvalueConfig.cmake
+  INSTALL_DESTINATION ${JSONVALUE_CMAKE_DIR})
+# Before 1.0 a minor version may break compatibility.
+write_basic_package_version_file(${CMAKE_CURRENT_BINARY_DIR}/jsonvalueConfigVersion.cmake
+  COMPATIBILITY SameMinorVersion)
+install(FILES
+  ${CMAKE_CURRENT_BINARY_DIR}/jsonvalueConfig.cmake
+  ${CMAKE_CURRENT_BINARY_DIR}/jsonvalueConfigVersion.cmake
+  DESTINATION ${JSONVALUE_CMAKE_DIR})
+
+configure_file(cmake/jsonvalue.pc.in ${CMAKE_CURRENT_BINARY_DIR}/jsonvalue.pc @ONLY)
+install(FILES ${CMAKE_CURRENT_BINARY_DIR}/jsonvalue.pc
+  DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)

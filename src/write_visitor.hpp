@@ -1,0 +1,57 @@
+#ifndef JSON_SRC_WRITE_VISITOR_HPP
+#define JSON_SRC_WRITE_VISITOR_HPP
+
+#include <json/value.hpp>
+
+#include <ostream>
+#include <string>
+
+namespace json::detail {
+
+/// The writer record of one Serializer::write call: the stream, the mode and the nesting level
+/// of the value it writes. Applied to a Value with boost::apply_visitor, it writes the
+/// alternative the Value holds.
+///
+/// Containers are written from an explicit stack of open containers rather than by applying a
+/// child record recursively, so the call stack stays flat however deep the document is; the
+/// text is the one the recursive layout describes, level L + 1 for the contents of a container
+/// at level L.
+class WriteVisitor : public boost::static_visitor<void> {
+  public:
+    WriteVisitor(std::ostream& out, bool pretty, int indent);
+
+    void operator()(const Undefined&) const {}
+    void operator()(const Null&) const;
+    void operator()(bool boolean) const;
+    void operator()(double number) const { write_number(number); }
+    void operator()(const std::string& text) const { write_string(text); }
+    void operator()(const Array& items) const { write_array(items); }
+    void operator()(const Object& members) const { write_object(members); }
+    void operator()(float number) const { write_number(number); }
+
+    /// The quoted, escaped string; used for string values and object keys.
+    void write_string(const std::string& text) const;
+    /// The number's text; NaN and the infinities as the strings "NaN", "Inf", "-Inf".
+    void write_number(double number) const;
+    void write_number(float number) const;
+    void write_array(const Array& items) const;
+    void write_object(const Object& members) const;
+    /// The widened '\n', then a flush: exactly what std::endl does.
+    void new_line() const;
+    /// `count` spaces.
+    void write_indent(int count) const;
+
+  private:
+    class ContainerWriter;
+
+    void write_bytes(const char* bytes, std::size_t count) const;
+    void write_unicode_escape(unsigned char byte) const;
+
+    std::ostream& out;
+    bool pretty;
+    int indent;
+};
+
+} // namespace json::detail
+
+#endif
