@@ -10,9 +10,13 @@ Serializer::Serializer() : pretty(false) {}
 
 Serializer::~Serializer() = default;
 
-void Serializer::pretty_print(bool on) { pretty = on; }
+void Serializer::pretty_print(bool on) {
+    pretty = on;
+}
 
-bool Serializer::pretty_print() const { return pretty; }
+bool Serializer::pretty_print() const {
+    return pretty;
+}
 
 void Serializer::write(std::ostream& out, const Value& value) {
     detail::WriteVisitor record(out, pretty, 0);
@@ -31,9 +35,13 @@ std::string write_to_string(const Value& value, bool pretty) {
 
 } // namespace
 
-std::string serialize(const Value& value) { return write_to_string(value, false); }
+std::string serialize(const Value& value) {
+    return write_to_string(value, false);
+}
 
-std::string pretty_print(const Value& value) { return write_to_string(value, true); }
+std::string pretty_print(const Value& value) {
+    return write_to_string(value, true);
+}
 
 std::ostream& operator<<(std::ostream& out, const Value& value) {
     Serializer().write(out, value);

@@ -40,59 +40,74 @@ bool is_empty_container(const Value& value) {
                                         : boost::get<Object>(value).empty();
 }
 
-Value& child_value(Value& item) { return item; }
-Value& child_value(Object::value_type& member) { return member.second; }
+Value& child_value(Value& item) {
+    return item;
+}
+Value& child_value(Object::value_type& member) {
+    return member.second;
+}
 
-// The alternative of `source` with its Array or Object left empty; everything else copied.
-// Returned as a prvalue so that it initialises the base of a Value in place.
-detail::ValueVariant shallow_copy(const Value& source) {
+// What a shallow copy of `source` copies: `source` itself, or for a container a constant
+// variant holding an empty one of its kind (made on first use, kept until exit). Copying that
+// variant costs one allocation; a prvalue variant would not do, since initialising a base class
+// from one moves it, and moving a recursive_wrapper allocates once more.
+const detail::ValueVariant& shallow_source(const Value& source) {
+    static const detail::ValueVariant empty_array{Array()};
+    static const detail::ValueVariant empty_object{Object()};
     switch (source.which()) {
     case ARRAY_INDEX:
-        return detail::ValueVariant(Array());
+        return empty_array;
     case OBJECT_INDEX:
-        return detail::ValueVariant(Object());
+        return empty_object;
     default:
-        return static_cast<const detail::ValueVariant&>(source);
+        return source;
     }
 }
 
-// Fills the empty container of `target` with a deep copy of the container of `source`.
-// Nested containers are created empty and filled from an explicit work list, so deep
-// documents never deepen the call stack. On std::bad_alloc the caller's Value is destroyed by
-// its owner, which releases every level built so far.
-void copy_contents(const Value& source, Value& target) {
-    struct Job {
-        const Value* source;
-        Value* target;
-    };
-    std::vector<Job> jobs{{&source, &target}};
-    auto copy_child = [&jobs](const Value& from, Value& to) {
+struct CopyJob {
+    const Value* source;
+    Value* target;
+};
+
+// Fills the empty container of `target` with shallow copies of the children of `source`'s
+// container, and lists each non-empty container child for a later fill.
+void copy_level(const Value& source, Value& target, std::vector<CopyJob>& nested) {
+    auto note_nested = [&nested](const Value& from, Value& to) {
         if (is_container(from) && !is_empty_container(from)) {
-            jobs.push_back({&from, &to});
+            nested.push_back({&from, &to});
         }
     };
-    while (!jobs.empty()) {
-        const Job job = jobs.back();
-        jobs.pop_back();
-        if (job.source->which() == ARRAY_INDEX) {
-            const Array& from = boost::get<Array>(*job.source);
-            Array& to = boost::get<Array>(*job.target);
-            to.reserve(from.size()); // no reallocation below: the pointers in `jobs` stay valid
-            for (const Value& item : from) {
-                to.emplace_back(detail::ShallowCopy{}, item);
-                copy_child(item, to.back());
-            }
-        } else {
-            const Object& from = boost::get<Object>(*job.source);
-            Object& to = boost::get<Object>(*job.target);
-            for (const auto& [key, value] : from) {
-                // Keys arrive in order, so the end hint makes each insertion constant time.
-                auto inserted = to.emplace_hint(to.end(), std::piecewise_construct,
-                                                std::forward_as_tuple(key),
-                                                std::forward_as_tuple(detail::ShallowCopy{}, value));
-                copy_child(value, inserted->second);
-            }
+    if (source.which() == ARRAY_INDEX) {
+        const Array& from = boost::get<Array>(source);
+        Array& to = boost::get<Array>(target);
+        to.reserve(from.size()); // no reallocation below: the pointers noted stay valid
+        for (const Value& item : from) {
+            to.emplace_back(detail::ShallowCopy{}, item);
+            note_nested(item, to.back());
         }
+    } else {
+        const Object& from = boost::get<Object>(source);
+        Object& to = boost::get<Object>(target);
+        for (const auto& [key, value] : from) {
+            // Keys arrive in order, so the end hint makes each insertion constant time.
+            auto inserted =
+                to.emplace_hint(to.end(), std::piecewise_construct, std::forward_as_tuple(key),
+                                std::forward_as_tuple(detail::ShallowCopy{}, value));
+            note_nested(value, inserted->second);
+        }
+    }
+}
+
+// Fills the empty container of `target` with a deep copy of the container of `source`, level
+// by level from an explicit work list, so deep documents never deepen the call stack. On
+// std::bad_alloc the owner of `target` destroys it, which releases every level built so far.
+void copy_contents(const Value& source, Value& target) {
+    std::vector<CopyJob> nested; // allocates only once a nested container turns up
+    copy_level(source, target, nested);
+    while (!nested.empty()) {
+        const CopyJob job = nested.back();
+        nested.pop_back();
+        copy_level(*job.source, *job.target, nested);
     }
 }
 
@@ -169,7 +184,8 @@ Value::Value(const Array& items) : detail::ValueVariant(items) {}
 
 Value::Value(const Object& members) : detail::ValueVariant(members) {}
 
-Value::Value(detail::ShallowCopy, const Value& other) : detail::ValueVariant(shallow_copy(other)) {}
+Value::Value(detail::ShallowCopy, const Value& other)
+    : detail::ValueVariant(shallow_source(other)) {}
 
 Value::Value(const Value& other) : Value(detail::ShallowCopy{}, other) {
     if (is_container(other) && !is_empty_container(other)) {

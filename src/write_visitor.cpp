@@ -165,7 +165,9 @@ class WriteVisitor::ContainerWriter {
 WriteVisitor::WriteVisitor(std::ostream& out, bool pretty, int indent)
     : out(out), pretty(pretty), indent(indent) {}
 
-void WriteVisitor::operator()(const Null&) const { write_bytes("null", 4); }
+void WriteVisitor::operator()(const Null&) const {
+    write_bytes("null", 4);
+}
 
 void WriteVisitor::operator()(bool boolean) const {
     if (boolean) {
@@ -175,7 +177,9 @@ void WriteVisitor::operator()(bool boolean) const {
     }
 }
 
-void WriteVisitor::write_array(const Array& items) const { ContainerWriter(*this).write(items, indent); }
+void WriteVisitor::write_array(const Array& items) const {
+    ContainerWriter(*this).write(items, indent);
+}
 
 void WriteVisitor::write_object(const Object& members) const {
     ContainerWriter(*this).write(members, indent);
@@ -216,13 +220,16 @@ void WriteVisitor::write_number(float number) const {
     write_bytes(text.data(), text.size());
 }
 
-void WriteVisitor::new_line() const { out << std::endl; }
+void WriteVisitor::new_line() const {
+    out << std::endl;
+}
 
 void WriteVisitor::write_indent(int count) const {
-    static constexpr char SPACES[] = "                                                                ";
-    constexpr int chunk = static_cast<int>(sizeof SPACES) - 1;
+    // Deep documents indent by thousands of spaces: write them in large pieces.
+    static const std::string spaces(1024, ' ');
+    const int chunk = static_cast<int>(spaces.size());
     for (; count > 0; count -= chunk) {
-        write_bytes(SPACES, static_cast<std::size_t>(count < chunk ? count : chunk));
+        write_bytes(spaces.data(), static_cast<std::size_t>(count < chunk ? count : chunk));
     }
 }
 

@@ -85,7 +85,8 @@ TEST(Value, TagsAreNotTheFallbackAlternative) {
     EXPECT_FALSE(std::is_nothrow_default_constructible_v<json::Null>);
     EXPECT_TRUE(std::is_nothrow_copy_constructible_v<json::Undefined>);
     EXPECT_TRUE(std::is_nothrow_copy_constructible_v<json::Null>);
-    EXPECT_FALSE(std::is_move_constructible_v<Value> && std::is_nothrow_move_constructible_v<Value>);
+    EXPECT_FALSE(std::is_move_constructible_v<Value> &&
+                 std::is_nothrow_move_constructible_v<Value>);
 }
 
 TEST(Value, SharedUndefinedConstant) {
@@ -142,8 +143,14 @@ TEST(Value, AssignmentChangesAlternative) {
 }
 
 TEST(Value, SelfAssignmentLeavesEveryAlternativeUnchanged) {
-    const Value samples[] = {Value(), Value(nullptr), true, 2.5, "text", sample_document(),
-                             boost::get<Array>(sample_document())[0], 1.5f};
+    const Value samples[] = {Value(),
+                             Value(nullptr),
+                             true,
+                             2.5,
+                             "text",
+                             sample_document(),
+                             boost::get<Array>(sample_document())[0],
+                             1.5f};
     for (const Value& sample : samples) {
         Value target = sample;
         Value& alias = target;
@@ -154,8 +161,13 @@ TEST(Value, SelfAssignmentLeavesEveryAlternativeUnchanged) {
 
 // The source lies inside the target's own tree: every combination of alternatives.
 TEST(Value, AssignmentFromInsideItsOwnTree) {
-    const Value payloads[] = {nullptr, true, 4.0, "a string long enough to live on the heap",
-                              Array{1, Array{2}}, Object{{"x", Object{{"y", 1}}}}, 0.5f};
+    const Value payloads[] = {nullptr,
+                              true,
+                              4.0,
+                              "a string long enough to live on the heap",
+                              Array{1, Array{2}},
+                              Object{{"x", Object{{"y", 1}}}},
+                              0.5f};
     for (const Value& payload : payloads) {
         Value in_array = Array{payload, 1};
         in_array = boost::get<Array>(in_array)[0];

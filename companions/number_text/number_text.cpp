@@ -30,7 +30,9 @@ int write_shortest(char* buffer, Number value) {
     return static_cast<int>(end - buffer);
 }
 
-bool is_digit(char c) { return c >= '0' && c <= '9'; }
+bool is_digit(char c) {
+    return c >= '0' && c <= '9';
+}
 
 // The decimal exponent of the leading non-zero digit of a number that from_chars found out of
 // range: positive for an overflow, negative for an underflow. Saturates, so that exponents
@@ -70,18 +72,21 @@ long long leading_digit_exponent(std::string_view number) {
 
 } // namespace
 
-int getDoubleValueStr(char* buffer, double value) { return write_shortest(buffer, value); }
+int getDoubleValueStr(char* buffer, double value) {
+    return write_shortest(buffer, value);
+}
 
-int getFloatValueStr(char* buffer, float value) { return write_shortest(buffer, value); }
+int getFloatValueStr(char* buffer, float value) {
+    return write_shortest(buffer, value);
+}
 
 double convertStrToDouble(const char* text) {
     const std::string_view number(text);
     double value = 0.0;
     const auto result = std::from_chars(number.data(), number.data() + number.size(), value);
     if (result.ec == std::errc::result_out_of_range) {
-        const double magnitude = leading_digit_exponent(number) > 0
-                                     ? std::numeric_limits<double>::infinity()
-                                     : 0.0;
+        const double magnitude =
+            leading_digit_exponent(number) > 0 ? std::numeric_limits<double>::infinity() : 0.0;
         return number.front() == '-' ? -magnitude : magnitude;
     }
     return result.ec == std::errc() ? value : 0.0;

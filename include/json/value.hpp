@@ -39,9 +39,9 @@ using Object = std::map<std::string, Value>;
 namespace detail {
 
 /// The eight alternatives of a Value, in their fixed order; the containers live on the heap.
-using ValueVariant = boost::variant<Undefined, Null, bool, double, std::string,
-                                    boost::recursive_wrapper<Array>,
-                                    boost::recursive_wrapper<Object>, float>;
+using ValueVariant =
+    boost::variant<Undefined, Null, bool, double, std::string, boost::recursive_wrapper<Array>,
+                   boost::recursive_wrapper<Object>, float>;
 
 /// The index that Value::which() returns for each alternative.
 enum Alternative : int {
@@ -123,9 +123,9 @@ class JSONVALUE_API Value : public detail::ValueVariant {
 
     /// Any integer but bool makes a double (alternative 3). Integers beyond 2^53 in magnitude
     /// are rounded to the nearest double and so may lose precision.
-    template <typename Integer,
-              std::enable_if_t<std::is_integral_v<Integer> && !std::is_same_v<Integer, bool>,
-                               int> = 0>
+    template <
+        typename Integer,
+        std::enable_if_t<std::is_integral_v<Integer> && !std::is_same_v<Integer, bool>, int> = 0>
     Value(Integer number) : detail::ValueVariant(static_cast<double>(number)) {}
 
     /// Pointers other than character pointers would silently become a bool: refused.
@@ -158,7 +158,9 @@ class JSONVALUE_API Value : public detail::ValueVariant {
 JSONVALUE_API bool operator==(const Value& left, const Value& right);
 
 /// The negation of operator==.
-inline bool operator!=(const Value& left, const Value& right) { return !(left == right); }
+inline bool operator!=(const Value& left, const Value& right) {
+    return !(left == right);
+}
 
 } // namespace json
 

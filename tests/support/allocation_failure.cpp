@@ -33,26 +33,46 @@ void release(void* block) noexcept {
 
 } // namespace
 
-void* operator new(std::size_t size) { return allocate(size); }
-void* operator new[](std::size_t size) { return allocate(size); }
-void operator delete(void* block) noexcept { release(block); }
-void operator delete[](void* block) noexcept { release(block); }
-void operator delete(void* block, std::size_t) noexcept { release(block); }
-void operator delete[](void* block, std::size_t) noexcept { release(block); }
+void* operator new(std::size_t size) {
+    return allocate(size);
+}
+void* operator new[](std::size_t size) {
+    return allocate(size);
+}
+void operator delete(void* block) noexcept {
+    release(block);
+}
+void operator delete[](void* block) noexcept {
+    release(block);
+}
+void operator delete(void* block, std::size_t) noexcept {
+    release(block);
+}
+void operator delete[](void* block, std::size_t) noexcept {
+    release(block);
+}
 
 namespace test_support {
 
-std::size_t live_blocks() { return live; }
+std::size_t live_blocks() {
+    return live;
+}
 
-std::size_t allocations_made() { return made; }
+std::size_t allocations_made() {
+    return made;
+}
 
 FailAllocation::FailAllocation(std::size_t n) {
     fail_at = made + n;
     failed = false;
 }
 
-FailAllocation::~FailAllocation() { fail_at = 0; }
+FailAllocation::~FailAllocation() {
+    fail_at = 0;
+}
 
-bool FailAllocation::triggered() const { return failed; }
+bool FailAllocation::triggered() const {
+    return failed;
+}
 
 } // namespace test_support
