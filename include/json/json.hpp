@@ -1,7 +1,8 @@
 #ifndef JSON_JSON_HPP
 #define JSON_JSON_HPP
 
-// Everything jsonvalue offers: the value model and the writer.
+// Everything jsonvalue offers: the value model, the builders and the writer.
+#include <json/builders.hpp>
 #include <json/serializer.hpp>
 #include <json/value.hpp>
 

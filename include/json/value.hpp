@@ -162,6 +162,23 @@ inline bool operator!=(const Value& left, const Value& right) {
     return !(left == right);
 }
 
+/// Comparison with anything a Value is made from (`v == 5`, `v == "text"`,
+/// `v == json::Array{}`): the right operand is converted to a Value first. Without these,
+/// boost::variant's own comparison templates would make such expressions ill-formed.
+template <typename T,
+          std::enable_if_t<std::is_constructible_v<Value, const T&> && !std::is_same_v<T, Value>,
+                           int> = 0>
+bool operator==(const Value& left, const T& right) {
+    return left == Value(right);
+}
+
+template <typename T,
+          std::enable_if_t<std::is_constructible_v<Value, const T&> && !std::is_same_v<T, Value>,
+                           int> = 0>
+bool operator!=(const Value& left, const T& right) {
+    return !(left == Value(right));
+}
+
 } // namespace json
 
 #endif
