@@ -5,7 +5,7 @@ include(CMakePackageConfigHelpers)
 set(JSONVALUE_CMAKE_DIR ${CMAKE_INSTALL_LIBDIR}/cmake/jsonvalue)
 
 install(DIRECTORY include/json TYPE INCLUDE)
-install(TARGETS jsonvalue jsonvalue_number_text
+install(TARGETS jsonvalue jsonvalue_number_text jsonvalue_text_encoding
   EXPORT jsonvalueTargets
   LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
   INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})

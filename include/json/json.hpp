@@ -1,8 +1,9 @@
 #ifndef JSON_JSON_HPP
 #define JSON_JSON_HPP
 
-// Everything jsonvalue offers: the value model, the builders and the writer.
+// Everything jsonvalue offers: the value model, the builders, the writer and parsing.
 #include <json/builders.hpp>
+#include <json/parse.hpp>
 #include <json/serializer.hpp>
 #include <json/value.hpp>
 
