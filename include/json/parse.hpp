@@ -2,8 +2,11 @@
 #define JSON_PARSE_HPP
 
 #include <json/detail/export.hpp>
+#include <json/value.hpp>
 
+#include <cstddef>
 #include <string>
+#include <string_view>
 
 namespace json {
 
@@ -52,6 +55,77 @@ JSONVALUE_API double string_to_double(const char* text);
 JSONVALUE_API std::string u16_to_u8(char16_t* text, int count);
 
 } // namespace detail
+
+/// Limits for json::parse.
+struct ParseOptions {
+    /// Arrays and objects nested deeper than this are refused.
+    std::size_t max_depth = 512;
+};
+
+/// The detailed outcome of json::parse: the code, and for a failure where it happened and,
+/// when the code alone says too little, a plain note on why.
+struct ParseReport {
+    ParseResult result = ParseResult::SUCCESS;
+    std::size_t offset = 0;     ///< byte offset of the failure in the text
+    std::size_t line = 0;       ///< 1-based line of the failure (0 on success)
+    std::size_t column = 0;     ///< 1-based column, counted in bytes (0 on success)
+    const char* note = nullptr; ///< e.g. "the document is nested deeper than the maximum depth"
+    bool too_deep = false;      ///< nesting beyond ParseOptions::max_depth was refused
+
+    explicit operator bool() const { return result == ParseResult::SUCCESS; }
+
+    /// The code's description, followed by the note when there is one.
+    std::string message() const {
+        std::string text = get_parse_result_description(result);
+        if (note != nullptr) {
+            text.append(" (").append(note).append(")");
+        }
+        return text;
+    }
+};
+
+} // namespace json
+
+#include <json/detail/parser.hpp>
+
+namespace json {
+
+/// Parses exactly one JSON text (RFC 8259): one value of any kind, with only whitespace
+/// around it. On success stores the document in `out`. On failure `out` is left exactly as it
+/// was and the report says where and why. Iterative, linear in the length of the text.
+///
+/// - Numbers become double (alternative 3); a number beyond the range of double becomes plus
+///   or minus infinity, one below it plus or minus zero.
+/// - A run of \u escapes is converted as UTF-16, so a surrogate pair becomes one character;
+///   an unpaired surrogate becomes U+FFFD. Bytes from 0x80 up are kept unchanged (no UTF-8
+///   validation), as the writer writes them. Raw control characters in strings are refused.
+/// - When an object has a member name twice, the last member wins.
+/// - Nesting deeper than options.max_depth is refused with MISSING_TRAILING_BRACKET or
+///   MISSING_TRAILING_BRACE and `too_deep` set.
+/// - Text after the value is refused with UNEXPECTED_END_OF_INPUT and a note saying so.
+///
+/// Throws std::bad_alloc, leaving `out` as it was.
+inline ParseReport parse(std::string_view text, Value& out, const ParseOptions& options) {
+    detail::Parser parser(text, options.max_depth);
+    ParseReport report;
+    report.result = parser.run(out);
+    if (report.result != ParseResult::SUCCESS) {
+        report.offset = parser.failure_offset();
+        report.note = parser.note();
+        report.too_deep = parser.nesting_too_deep();
+        const std::string_view before = text.substr(0, report.offset);
+        const std::size_t line_start = before.rfind('\n');
+        report.line = 1 + static_cast<std::size_t>(std::count(before.begin(), before.end(), '\n'));
+        report.column =
+            report.offset - (line_start == std::string_view::npos ? 0 : line_start + 1) + 1;
+    }
+    return report;
+}
+
+/// Parses as above with the default options and returns the code alone.
+inline ParseResult parse(std::string_view text, Value& out) {
+    return parse(text, out, ParseOptions()).result;
+}
 
 } // namespace json
 

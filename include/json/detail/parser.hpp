@@ -1,0 +1,414 @@
+#ifndef JSON_DETAIL_PARSER_HPP
+#define JSON_DETAIL_PARSER_HPP
+
+// The strict JSON parser behind json::parse; included by json/parse.hpp, after the
+// declarations it uses. Header-level: it is compiled into its users and reaches the library
+// only through the Value model and the two exported conversions.
+
+#include <json/value.hpp>
+
+#include <algorithm>
+#include <cstddef>
+#include <deque>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace json {
+namespace detail {
+
+/// Calls `place` with an empty container or string of `child`'s kind (or a copy of a scalar
+/// child) to construct the Value in its final place, then swaps `child`'s content into it:
+/// a subtree changes owner without being copied.
+template <typename Place>
+void adopt(Value& child, Place place) {
+    switch (child.which()) {
+    case ARRAY_INDEX:
+        boost::get<Array>(place(Array())).swap(boost::get<Array>(child));
+        break;
+    case OBJECT_INDEX:
+        boost::get<Object>(place(Object())).swap(boost::get<Object>(child));
+        break;
+    case STRING_INDEX:
+        boost::get<std::string>(place(std::string())).swap(boost::get<std::string>(child));
+        break;
+    default:
+        place(static_cast<const Value&>(child));
+    }
+}
+
+/// Gives `out` the content of `document` without copying it. Strong guarantee: changing
+/// `out`'s alternative to a container needs one allocation; if it fails, `out` gets its old
+/// content back (which, for a container of the other kind, needs one allocation too).
+inline void hand_over(Value& document, Value& out) {
+    if (document.which() != ARRAY_INDEX && document.which() != OBJECT_INDEX &&
+        document.which() != STRING_INDEX) {
+        out = document; // a scalar: cannot fail
+        return;
+    }
+    if (out.which() != document.which()) {
+        Value previous; // out's content, set aside without copying
+        adopt(out, [&previous](const auto& empty) -> Value& { return previous = empty; });
+        try {
+            adopt(document, [&out](const auto& empty) -> Value& { return out = empty; });
+        } catch (...) {
+            adopt(previous, [&out](const auto& empty) -> Value& { return out = empty; });
+            throw;
+        }
+        return;
+    }
+    adopt(document, [&out](const auto&) -> Value& { return out; });
+}
+
+/// One parse of one text. Iterative: open containers live on explicit stacks, so the depth a
+/// document may have is limited by ParseOptions::max_depth alone, never by the call stack.
+class Parser {
+  public:
+    Parser(std::string_view text, std::size_t max_depth)
+        : begin(text.data()), cursor(text.data()), end(text.data() + text.size()),
+          max_depth(max_depth) {}
+
+    /// Parses the whole text into `document`; on failure records where and why.
+    ParseResult run(Value& document);
+
+    /// Where parsing stopped, why, and extra wording when the code alone says too little.
+    std::size_t failure_offset() const { return static_cast<std::size_t>(cursor - begin); }
+    const char* note() const { return failure_note; }
+    bool nesting_too_deep() const { return too_deep; }
+
+  private:
+    struct OpenContainer {
+        bool is_object;
+        std::size_t first_value; // index into `values` of its first child
+        std::size_t first_name;  // index into `names` of its first member name
+    };
+
+    ParseResult parse_value(bool& completed);
+    ParseResult parse_string(std::string& text);
+    ParseResult parse_escape(std::string& text);
+    ParseResult parse_unicode_escapes(std::string& text);
+    ParseResult parse_number();
+    ParseResult parse_literal(std::string_view literal, ParseResult mismatch);
+    ParseResult parse_member_name();
+    ParseResult open(bool is_object);
+    void close();
+    ParseResult fail(ParseResult result, const char* note = nullptr) {
+        failure_note = note;
+        return result;
+    }
+    void skip_whitespace() {
+        while (cursor != end &&
+               (*cursor == ' ' || *cursor == '\n' || *cursor == '\r' || *cursor == '\t')) {
+            ++cursor;
+        }
+    }
+    bool at(char c) const { return cursor != end && *cursor == c; }
+
+    const char* const begin;
+    const char* cursor;
+    const char* const end;
+    const std::size_t max_depth;
+    const char* failure_note = nullptr;
+    bool too_deep = false;
+
+    std::deque<Value> values;       // finished values whose container is still open
+    std::vector<std::string> names; // member names of the open objects, in document order
+    std::vector<OpenContainer> open_containers;
+    std::string number_text;     // reused buffer for the NUL-terminated number text
+    std::vector<char16_t> utf16; // reused buffer for a run of \u escapes
+};
+
+inline ParseResult Parser::run(Value& out) {
+    skip_whitespace();
+    if (cursor == end) {
+        return fail(ParseResult::EMPTY_INPUT);
+    }
+    bool expect_value = true;
+    for (;;) {
+        if (expect_value) {
+            skip_whitespace();
+            bool completed = false;
+            if (const ParseResult result = parse_value(completed); result != ParseResult::SUCCESS) {
+                return result;
+            }
+            if (!completed) {
+                continue; // a container was opened: its first value comes next
+            }
+        }
+        if (open_containers.empty()) {
+            skip_whitespace();
+            if (cursor != end) {
+                return fail(ParseResult::UNEXPECTED_END_OF_INPUT,
+                            "the text goes on after the JSON value");
+            }
+            hand_over(values.back(), out);
+            return ParseResult::SUCCESS;
+        }
+        skip_whitespace();
+        const bool in_object = open_containers.back().is_object;
+        if (cursor == end) {
+            return fail(ParseResult::UNEXPECTED_END_OF_INPUT);
+        }
+        if (*cursor == ',') {
+            ++cursor;
+            expect_value = true;
+            if (in_object) {
+                skip_whitespace();
+                if (const ParseResult result = parse_member_name();
+                    result != ParseResult::SUCCESS) {
+                    return result;
+                }
+            }
+        } else if (*cursor == (in_object ? '}' : ']')) {
+            ++cursor;
+            close();
+            expect_value = false;
+        } else {
+            return fail(in_object ? ParseResult::MISSING_TRAILING_BRACE
+                                  : ParseResult::MISSING_TRAILING_BRACKET);
+        }
+    }
+}
+
+inline ParseResult Parser::parse_value(bool& completed) {
+    completed = true;
+    if (cursor == end) {
+        return fail(ParseResult::UNEXPECTED_END_OF_INPUT);
+    }
+    switch (*cursor) {
+    case '[':
+    case '{': {
+        const bool is_object = *cursor == '{';
+        if (const ParseResult result = open(is_object); result != ParseResult::SUCCESS) {
+            return result;
+        }
+        skip_whitespace();
+        if (at(is_object ? '}' : ']')) {
+            ++cursor;
+            close();
+            return ParseResult::SUCCESS;
+        }
+        completed = false;
+        return is_object ? parse_member_name() : ParseResult::SUCCESS;
+    }
+    case '"':
+        return parse_string(boost::get<std::string>(values.emplace_back(std::string())));
+    case 't':
+        return parse_literal("true", ParseResult::INVALID_BOOLEAN);
+    case 'f':
+        return parse_literal("false", ParseResult::INVALID_BOOLEAN);
+    case 'n':
+        return parse_literal("null", ParseResult::INVALID_NULL);
+    default:
+        // A number is the last kind of value tried: anything else fails as a number would.
+        return parse_number();
+    }
+}
+
+inline ParseResult Parser::parse_member_name() {
+    if (cursor == end) {
+        return fail(ParseResult::UNEXPECTED_END_OF_INPUT);
+    }
+    if (*cursor != '"') {
+        return fail(ParseResult::MISSING_LEADING_QUOTE, "a member name must be a string");
+    }
+    if (const ParseResult result = parse_string(names.emplace_back());
+        result != ParseResult::SUCCESS) {
+        return result;
+    }
+    skip_whitespace();
+    if (cursor == end) {
+        return fail(ParseResult::UNEXPECTED_END_OF_INPUT);
+    }
+    if (*cursor != ':') {
+        return fail(ParseResult::MISSING_COLON);
+    }
+    ++cursor;
+    return ParseResult::SUCCESS;
+}
+
+inline ParseResult Parser::parse_string(std::string& text) {
+    ++cursor; // the opening quote
+    for (;;) {
+        // Bytes that need no attention are copied in one piece; bytes from 0x80 up are kept
+        // as they are.
+        const char* const run = cursor;
+        cursor = std::find_if(cursor, end, [](char c) {
+            return c == '"' || c == '\\' || static_cast<unsigned char>(c) < 0x20;
+        });
+        text.append(run, cursor);
+        if (cursor == end) {
+            return fail(ParseResult::MISSING_TRAILING_QUOTE, "the string is not closed");
+        }
+        if (*cursor == '"') {
+            ++cursor;
+            return ParseResult::SUCCESS;
+        }
+        if (*cursor != '\\') {
+            return fail(ParseResult::MISSING_TRAILING_QUOTE,
+                        "a control character inside a string must be escaped");
+        }
+        if (const ParseResult result = parse_escape(text); result != ParseResult::SUCCESS) {
+            return result;
+        }
+    }
+}
+
+inline ParseResult Parser::parse_escape(std::string& text) {
+    ++cursor; // the backslash
+    if (cursor == end) {
+        return fail(ParseResult::INCOMPLETE_ESCAPE);
+    }
+    static constexpr std::string_view escaped = "\"\\/bfnrt";
+    static constexpr std::string_view meant = "\"\\/\b\f\n\r\t";
+    const std::size_t which = escaped.find(*cursor);
+    if (which != std::string_view::npos) {
+        text += meant[which];
+        ++cursor;
+        return ParseResult::SUCCESS;
+    }
+    if (*cursor == 'u') {
+        return parse_unicode_escapes(text);
+    }
+    return fail(ParseResult::INVALID_ESCAPE);
+}
+
+// A run of \u escapes is converted at once, so that a surrogate pair split over two escapes
+// becomes one character. The cursor is on the 'u' of the first escape.
+inline ParseResult Parser::parse_unicode_escapes(std::string& text) {
+    utf16.clear();
+    for (;;) {
+        ++cursor; // the 'u'
+        char16_t unit = 0;
+        for (int digit = 0; digit < 4; ++digit, ++cursor) {
+            if (cursor == end) {
+                return fail(ParseResult::INCOMPLETE_ESCAPE);
+            }
+            const char c = *cursor;
+            const int value = c >= '0' && c <= '9'   ? c - '0'
+                              : c >= 'a' && c <= 'f' ? c - 'a' + 10
+                              : c >= 'A' && c <= 'F' ? c - 'A' + 10
+                                                     : -1;
+            if (value < 0) {
+                return fail(ParseResult::INVALID_UNICODE_ESCAPE);
+            }
+            unit = static_cast<char16_t>(unit * 16 + value);
+        }
+        utf16.push_back(unit);
+        if (end - cursor < 2 || cursor[0] != '\\' || cursor[1] != 'u') {
+            break;
+        }
+        ++cursor; // the backslash of the next escape
+    }
+    text += u16_to_u8(utf16.data(), static_cast<int>(utf16.size()));
+    return ParseResult::SUCCESS;
+}
+
+inline ParseResult Parser::parse_number() {
+    const auto digit_here = [this] { return cursor != end && *cursor >= '0' && *cursor <= '9'; };
+    const auto skip_digits = [&] {
+        while (digit_here()) {
+            ++cursor;
+        }
+    };
+    const char* const start = cursor;
+    if (at('-')) {
+        ++cursor;
+        if (!digit_here()) {
+            return fail(ParseResult::MISSING_QUANTITY_AFTER_SIGN);
+        }
+    }
+    if (!digit_here()) {
+        return fail(ParseResult::MISSING_LEADING_DIGIT, "no JSON value starts here");
+    }
+    if (*cursor == '0') {
+        ++cursor; // no further digits after a leading zero
+    } else {
+        skip_digits();
+    }
+    if (at('.')) {
+        ++cursor;
+        if (!digit_here()) {
+            return fail(ParseResult::INVALID_FRACTION);
+        }
+        skip_digits();
+    }
+    if (at('e') || at('E')) {
+        ++cursor;
+        if (at('+') || at('-')) {
+            ++cursor;
+        }
+        if (!digit_here()) {
+            return fail(ParseResult::INVALID_EXPONENT);
+        }
+        skip_digits();
+    }
+    number_text.assign(start, cursor);
+    values.emplace_back(string_to_double(number_text.c_str()));
+    return ParseResult::SUCCESS;
+}
+
+inline ParseResult Parser::parse_literal(std::string_view literal, ParseResult mismatch) {
+    if (static_cast<std::size_t>(end - cursor) < literal.size() ||
+        std::string_view(cursor, literal.size()) != literal) {
+        return fail(mismatch);
+    }
+    cursor += literal.size();
+    if (literal == "null") {
+        values.emplace_back(Null());
+    } else {
+        values.emplace_back(literal == "true");
+    }
+    return ParseResult::SUCCESS;
+}
+
+inline ParseResult Parser::open(bool is_object) {
+    if (open_containers.size() >= max_depth) {
+        too_deep = true;
+        return fail(is_object ? ParseResult::MISSING_TRAILING_BRACE
+                              : ParseResult::MISSING_TRAILING_BRACKET,
+                    "the document is nested deeper than the maximum depth");
+    }
+    ++cursor;
+    open_containers.push_back({is_object, values.size(), names.size()});
+    return ParseResult::SUCCESS;
+}
+
+// Builds the innermost open container at its final size from the values parsed for it,
+// adopting each one without a copy, and leaves it as one finished value.
+inline void Parser::close() {
+    const OpenContainer container = open_containers.back();
+    open_containers.pop_back();
+    const auto children = values.begin() + static_cast<std::ptrdiff_t>(container.first_value);
+    if (container.is_object) {
+        Object members;
+        auto name = names.begin() + static_cast<std::ptrdiff_t>(container.first_name);
+        for (auto child = children; child != values.end(); ++child, ++name) {
+            // A later member with the same name replaces an earlier one.
+            adopt(*child, [&members, &name](const auto& initial) -> Value& {
+                auto [member, inserted] = members.try_emplace(std::move(*name), initial);
+                if (!inserted) {
+                    member->second = initial;
+                }
+                return member->second;
+            });
+        }
+        names.resize(container.first_name);
+        values.erase(children, values.end());
+        boost::get<Object>(values.emplace_back(Object())).swap(members);
+    } else {
+        Array items;
+        items.reserve(values.size() - container.first_value);
+        for (auto child = children; child != values.end(); ++child) {
+            adopt(*child,
+                  [&items](const auto& initial) -> Value& { return items.emplace_back(initial); });
+        }
+        values.erase(children, values.end());
+        boost::get<Array>(values.emplace_back(Array())).swap(items);
+    }
+}
+
+} // namespace detail
+} // namespace json
+
+#endif
