@@ -3,7 +3,7 @@
 # locale tests use. Does nothing when everything is already there.
 set -euo pipefail
 
-packages=(g++ cmake make pkg-config libboost1.81-dev libgtest-dev clang-format locales "$@")
+packages=(g++ cmake make pkg-config libboost1.81-dev libgtest-dev clang-format clang-tidy locales "$@")
 
 missing=()
 for package in "${packages[@]}"; do

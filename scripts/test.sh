@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
 # Builds and runs every test twice: with AddressSanitizer and UndefinedBehaviorSanitizer, and
-# as a Release build with warnings as errors. Also checks the formatting.
+# as a Release build with warnings as errors. Also checks formatting and clang-tidy.
 set -euo pipefail
 root=$(cd "$(dirname "$0")/.." && pwd)
 cd "$root"
@@ -21,4 +21,7 @@ run_build() {
 }
 
 run_build sanitize -DCMAKE_BUILD_TYPE=Debug -DJSONVALUE_SANITIZE=ON
-run_build release -DCMAKE_BUILD_TYPE=Release
+run_build release -DCMAKE_BUILD_TYPE=Release -DCMAKE_EXPORT_COMPILE_COMMANDS=ON
+
+echo "== clang-tidy"
+scripts/tidy.sh build/release

@@ -24,7 +24,9 @@ const char* const traits<float>::name = "float";
 template <>
 const char* const traits<int>::name = "int";
 
-const Value Value::UNDEFINED;
+// Building Undefined allocates nothing and cannot fail; its constructor is merely not
+// declared noexcept (see Undefined).
+const Value Value::UNDEFINED; // NOLINT(cert-err58-cpp)
 
 namespace {
 

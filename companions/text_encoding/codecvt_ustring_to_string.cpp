@@ -83,7 +83,8 @@ codecvt_ustring_to_string::codecvt_ustring_to_string(const std::string& encoding
         return;
     }
     const iconv_t descriptor = iconv_open(encoding.c_str(), "UTF-16LE");
-    if (descriptor == reinterpret_cast<iconv_t>(-1)) {
+    // iconv_open's documented failure value.
+    if (descriptor == reinterpret_cast<iconv_t>(-1)) { // NOLINT(performance-no-int-to-ptr)
         throw std::invalid_argument("codecvt_ustring_to_string: unknown encoding \"" + encoding +
                                     "\"");
     }

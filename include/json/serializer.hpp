@@ -28,7 +28,8 @@ class JSONVALUE_API Serializer {
   public:
     /// Compact mode.
     Serializer();
-    ~Serializer();
+    // Defined in the library, which exports it.
+    ~Serializer(); // NOLINT(performance-trivially-destructible)
 
     /// Sets the mode: true for pretty text, false for compact text.
     void pretty_print(bool on);

@@ -18,14 +18,14 @@ class JSONVALUE_API Undefined {
   public:
     // User-provided and not noexcept on purpose: boost::variant falls back to the first
     // alternative whose default constructor cannot throw, and that has to be bool.
-    Undefined() {}
+    Undefined() {} // NOLINT(modernize-use-equals-default)
 };
 
 /// Tag type of alternative 1: the JSON literal null.
 class JSONVALUE_API Null {
   public:
     // Not noexcept, for the same reason as Undefined().
-    Null() {}
+    Null() {} // NOLINT(modernize-use-equals-default)
 };
 
 class Value;

@@ -68,8 +68,9 @@ class Parser {
         : begin(text.data()), cursor(text.data()), end(text.data() + text.size()),
           max_depth(max_depth) {}
 
-    /// Parses the whole text into `document`; on failure records where and why.
-    ParseResult run(Value& document);
+    /// Parses the whole text and hands the document to `out`; on failure leaves `out` as it
+    /// was and records where and why.
+    ParseResult run(Value& out);
 
     /// Where parsing stopped, why, and extra wording when the code alone says too little.
     std::size_t failure_offset() const { return static_cast<std::size_t>(cursor - begin); }
