@@ -1,8 +1,7 @@
 #include <json/serializer.hpp>
 
+#include "string_stream.hpp"
 #include "write_visitor.hpp"
-
-#include <sstream>
 
 namespace json {
 
@@ -19,8 +18,10 @@ bool Serializer::pretty_print() const {
 }
 
 void Serializer::write(std::ostream& out, const Value& value) {
-    detail::WriteVisitor record(out, pretty, 0);
+    detail::OutputBuffer buffer(out);
+    detail::WriteVisitor record(buffer, pretty, 0);
     boost::apply_visitor(record, value);
+    buffer.flush();
 }
 
 namespace {
@@ -28,9 +29,9 @@ namespace {
 std::string write_to_string(const Value& value, bool pretty) {
     Serializer serializer;
     serializer.pretty_print(pretty);
-    std::ostringstream text;
+    detail::StringStream text;
     serializer.write(text, value);
-    return text.str();
+    return text.take();
 }
 
 } // namespace

@@ -4,7 +4,7 @@
 
 #include <array>
 #include <cmath>
-#include <cstdlib>
+#include <cstdint>
 #include <cstring>
 #include <limits>
 #include <string_view>
@@ -34,21 +34,29 @@ constexpr std::array<char, 256> make_escape_table() {
 
 constexpr std::array<char, 256> ESCAPES = make_escape_table();
 
-// The text of a number: the number-text library's for finite values, JSON strings for NaN and
-// the infinities, which it never sees. `buffer` is zero-filled by the caller.
-template <typename Number>
-std::string_view number_text(Number number, char (&buffer)[80], int (*format)(char*, Number)) {
-    if (std::isnan(number)) {
-        return "\"NaN\"";
+// Whether any of the eight bytes of `word` needs an escape: below 0x20, '"', '/' or '\\'.
+// The bit tricks are exact for "any byte" (they only blur which byte), which is all the scan
+// below asks of them.
+inline bool needs_escape(std::uint64_t word) {
+    constexpr std::uint64_t ones = 0x0101010101010101;
+    constexpr std::uint64_t highs = 0x8080808080808080;
+    const auto has_zero = [](std::uint64_t v) { return (v - ones) & ~v & highs; };
+    const std::uint64_t below_space = (word - ones * 0x20) & ~word & highs;
+    return (below_space | has_zero(word ^ (ones * '"')) | has_zero(word ^ (ones * '/')) |
+            has_zero(word ^ (ones * '\\'))) != 0;
+}
+
+// The first byte at or after `from` that needs an escape, or `end`; eight bytes at a time
+// while they are clean.
+inline const char* next_escape(const char* from, const char* end) {
+    std::uint64_t word = 0;
+    while (end - from >= 8 && (std::memcpy(&word, from, 8), !needs_escape(word))) {
+        from += 8;
     }
-    if (number > std::numeric_limits<Number>::max()) {
-        return "\"Inf\"";
+    while (from != end && ESCAPES[static_cast<unsigned char>(*from)] == 0) {
+        ++from;
     }
-    if (number < -std::numeric_limits<Number>::max()) {
-        return "\"-Inf\"";
-    }
-    format(buffer, number);
-    return std::string_view(buffer, strnlen(buffer, sizeof buffer));
+    return from;
 }
 
 } // namespace
@@ -154,7 +162,7 @@ class WriteVisitor::ContainerWriter {
             record.write_bytes("null", 4);
             break;
         default:
-            boost::apply_visitor(WriteVisitor(record.out, record.pretty, level), value);
+            boost::apply_visitor(WriteVisitor(record.buffer, record.pretty, level), value);
         }
     }
 
@@ -162,8 +170,8 @@ class WriteVisitor::ContainerWriter {
     std::vector<Frame> open_containers;
 };
 
-WriteVisitor::WriteVisitor(std::ostream& out, bool pretty, int indent)
-    : out(out), pretty(pretty), indent(indent) {}
+WriteVisitor::WriteVisitor(OutputBuffer& buffer, bool pretty, int indent)
+    : buffer(buffer), out(buffer.stream()), pretty(pretty), indent(indent) {}
 
 void WriteVisitor::operator()(const Null&) const {
     write_bytes("null", 4);
@@ -186,16 +194,17 @@ void WriteVisitor::write_object(const Object& members) const {
 }
 
 void WriteVisitor::write_string(const std::string& text) const {
-    write_bytes("\"", 1);
+    buffer.put('"');
     const char* run = text.data();
     const char* const end = run + text.size();
-    for (const char* byte = run; byte != end; ++byte) {
-        const char escape = ESCAPES[static_cast<unsigned char>(*byte)];
-        if (escape == 0) {
-            continue;
-        }
-        // Bytes that need no escape go out as one run per write.
+    for (;;) {
+        // Bytes that need no escape go out as one run.
+        const char* const byte = next_escape(run, end);
         write_bytes(run, static_cast<std::size_t>(byte - run));
+        if (byte == end) {
+            break;
+        }
+        const char escape = ESCAPES[static_cast<unsigned char>(*byte)];
         if (escape == 'u') {
             write_unicode_escape(static_cast<unsigned char>(*byte));
         } else {
@@ -204,24 +213,41 @@ void WriteVisitor::write_string(const std::string& text) const {
         }
         run = byte + 1;
     }
-    write_bytes(run, static_cast<std::size_t>(end - run));
-    write_bytes("\"", 1);
+    buffer.put('"');
 }
 
 void WriteVisitor::write_number(double number) const {
-    char buffer[80] = {};
-    const std::string_view text = number_text(number, buffer, getDoubleValueStr);
-    write_bytes(text.data(), text.size());
+    write_number_text(number, getDoubleValueStr);
 }
 
 void WriteVisitor::write_number(float number) const {
-    char buffer[80] = {};
-    const std::string_view text = number_text(number, buffer, getFloatValueStr);
-    write_bytes(text.data(), text.size());
+    write_number_text(number, getFloatValueStr);
+}
+
+// NaN and the infinities are written as strings; every finite number is formatted by the
+// number-text library straight into 80 zeroed bytes of the buffer, then kept up to its NUL.
+template <typename Number>
+void WriteVisitor::write_number_text(Number number, int (*format)(char*, Number)) const {
+    if (std::isnan(number)) {
+        write_bytes("\"NaN\"", 5);
+    } else if (number > std::numeric_limits<Number>::max()) {
+        write_bytes("\"Inf\"", 5);
+    } else if (number < -std::numeric_limits<Number>::max()) {
+        write_bytes("\"-Inf\"", 6);
+    } else {
+        constexpr std::size_t size = 80;
+        char* const text = buffer.reserve(size);
+        std::memset(text, 0, size);
+        format(text, number);
+        buffer.commit(text + strnlen(text, size));
+    }
 }
 
 void WriteVisitor::new_line() const {
-    out << std::endl;
+    buffer.flush();
+    buffer.put(out.widen('\n'));
+    buffer.flush();
+    out.flush();
 }
 
 void WriteVisitor::write_indent(int count) const {
@@ -233,17 +259,12 @@ void WriteVisitor::write_indent(int count) const {
     }
 }
 
-void WriteVisitor::write_bytes(const char* bytes, std::size_t count) const {
-    if (count != 0) {
-        out.write(bytes, static_cast<std::streamsize>(count));
-    }
-}
-
 // \u and four hex digits through the stream's own formatting. The fill character is left at
 // '0' afterwards; the format flags are restored once the digits are out.
 void WriteVisitor::write_unicode_escape(unsigned char byte) const {
     const std::ios_base::fmtflags saved = out.flags();
     write_bytes("\\u", 2);
+    buffer.flush(); // the digits come from the stream itself
     out.width(4);
     out.fill('0');
     out.setf(std::ios_base::hex, std::ios_base::basefield);

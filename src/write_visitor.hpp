@@ -1,6 +1,8 @@
 #ifndef JSON_SRC_WRITE_VISITOR_HPP
 #define JSON_SRC_WRITE_VISITOR_HPP
 
+#include "output_buffer.hpp"
+
 #include <json/value.hpp>
 
 #include <ostream>
@@ -8,9 +10,9 @@
 
 namespace json::detail {
 
-/// The writer record of one Serializer::write call: the stream, the mode and the nesting level
-/// of the value it writes. Applied to a Value with boost::apply_visitor, it writes the
-/// alternative the Value holds.
+/// The writer record of one Serializer::write call: the stream (behind the call's output
+/// buffer), the mode and the nesting level of the value it writes. Applied to a Value with
+/// boost::apply_visitor, it writes the alternative the Value holds.
 ///
 /// Containers are written from an explicit stack of open containers rather than by applying a
 /// child record recursively, so the call stack stays flat however deep the document is; the
@@ -18,7 +20,7 @@ namespace json::detail {
 /// at level L.
 class WriteVisitor : public boost::static_visitor<void> {
   public:
-    WriteVisitor(std::ostream& out, bool pretty, int indent);
+    WriteVisitor(OutputBuffer& buffer, bool pretty, int indent);
 
     void operator()(const Undefined&) const {}
     void operator()(const Null&) const;
@@ -44,9 +46,12 @@ class WriteVisitor : public boost::static_visitor<void> {
   private:
     class ContainerWriter;
 
-    void write_bytes(const char* bytes, std::size_t count) const;
+    void write_bytes(const char* bytes, std::size_t count) const { buffer.append(bytes, count); }
     void write_unicode_escape(unsigned char byte) const;
+    template <typename Number>
+    void write_number_text(Number number, int (*format)(char*, Number)) const;
 
+    OutputBuffer& buffer;
     std::ostream& out;
     bool pretty;
     int indent;
