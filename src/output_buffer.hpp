@@ -51,6 +51,18 @@ class OutputBuffer {
 
     static constexpr std::size_t CAPACITY = 16 * 1024;
 
+    /// The stream's widened '\n'. The first call hands the buffered text to the stream before
+    /// it asks: widen() throws std::bad_cast when the locale has no std::ctype<char>, and the
+    /// text so far must be out by then. Once it has answered, its answer is reused.
+    char newline() {
+        if (!widened_newline_known) {
+            flush();
+            widened_newline = out.widen('\n');
+            widened_newline_known = true;
+        }
+        return widened_newline;
+    }
+
     /// Hands everything buffered to the stream.
     void flush() {
         if (used != 0) {
@@ -61,6 +73,8 @@ class OutputBuffer {
 
   private:
     std::ostream& out;
+    bool widened_newline_known = false;
+    char widened_newline = '\n';
     std::size_t used = 0;
     char data[CAPACITY];
 };

@@ -243,9 +243,9 @@ void WriteVisitor::write_number_text(Number number, int (*format)(char*, Number)
     }
 }
 
+// What std::endl does: the widened '\n', then a flush, with every byte before it delivered.
 void WriteVisitor::new_line() const {
-    buffer.flush();
-    buffer.put(out.widen('\n'));
+    buffer.put(buffer.newline());
     buffer.flush();
     out.flush();
 }
