@@ -4,26 +4,36 @@
 #include <cstddef>
 #include <cstring>
 #include <ostream>
+#include <string>
 
 namespace json::detail {
 
-/// Collects the writer's output and hands it to the stream with one write() per buffer full.
-/// Going through the stream's public write() keeps all of its own behaviour: a stream that
-/// has gone bad receives nothing, a short write sets badbit, and the exceptions the caller
-/// enabled are thrown. What is still buffered when an exception passes is not written.
+/// Where the writer's text goes: a caller's stream, or straight into a string.
+///
+/// Stream: the text is gathered and handed to the stream with one write() per buffer full.
+/// Going through the stream's public functions keeps all of its own behaviour: a stream that
+/// has gone bad receives nothing, a short write sets badbit, the exceptions the caller enabled
+/// are thrown. Each newline is widened by the stream and flushed, as std::endl does, and \u
+/// escapes use the stream's own number formatting.
+///
+/// String: for json::serialize and json::pretty_print, whose stream nobody else sees. The text
+/// is what a std::ostringstream in its default state would hold: newlines widened by the
+/// global locale, escapes as its default formatting writes them; flushing such a stream does
+/// nothing, so nothing is flushed.
 class OutputBuffer {
   public:
-    explicit OutputBuffer(std::ostream& out) : out(out) {}
+    explicit OutputBuffer(std::ostream& out) : out(&out), text(nullptr) {}
+    explicit OutputBuffer(std::string& text)
+        : out(nullptr), text(&text), widened_newline_known(true),
+          widened_newline(std::use_facet<std::ctype<char>>(std::locale()).widen('\n')) {}
     OutputBuffer(const OutputBuffer&) = delete;
     OutputBuffer& operator=(const OutputBuffer&) = delete;
-
-    std::ostream& stream() const { return out; }
 
     void append(const char* bytes, std::size_t count) {
         if (count > CAPACITY - used) {
             flush();
             if (count >= CAPACITY) {
-                out.write(bytes, static_cast<std::streamsize>(count));
+                deliver(bytes, count);
                 return;
             }
         }
@@ -49,30 +59,33 @@ class OutputBuffer {
 
     void commit(const char* end) { used = static_cast<std::size_t>(end - data); }
 
-    static constexpr std::size_t CAPACITY = 16 * 1024;
+    /// A widened newline, then a flush, with every byte before it delivered.
+    void new_line();
 
-    /// The stream's widened '\n'. The first call hands the buffered text to the stream before
-    /// it asks: widen() throws std::bad_cast when the locale has no std::ctype<char>, and the
-    /// text so far must be out by then. Once it has answered, its answer is reused.
-    char newline() {
-        if (!widened_newline_known) {
-            flush();
-            widened_newline = out.widen('\n');
-            widened_newline_known = true;
-        }
-        return widened_newline;
-    }
+    /// "\u" and the byte as four hexadecimal digits.
+    void unicode_escape(unsigned char byte);
 
-    /// Hands everything buffered to the stream.
+    /// Hands everything buffered on.
     void flush() {
         if (used != 0) {
-            out.write(data, static_cast<std::streamsize>(used));
+            deliver(data, used);
             used = 0;
         }
     }
 
+    static constexpr std::size_t CAPACITY = 16 * 1024;
+
   private:
-    std::ostream& out;
+    void deliver(const char* bytes, std::size_t count) {
+        if (out != nullptr) {
+            out->write(bytes, static_cast<std::streamsize>(count));
+        } else {
+            text->append(bytes, count);
+        }
+    }
+
+    std::ostream* out;
+    std::string* text;
     bool widened_newline_known = false;
     char widened_newline = '\n';
     std::size_t used = 0;

@@ -1,6 +1,5 @@
 #include <json/serializer.hpp>
 
-#include "string_stream.hpp"
 #include "write_visitor.hpp"
 
 namespace json {
@@ -26,12 +25,17 @@ void Serializer::write(std::ostream& out, const Value& value) {
 
 namespace {
 
+// The text a Serializer would write into a std::ostringstream in its default state, written
+// straight into the string instead: nobody else sees that stream, so the stream's
+// bookkeeping (a flush per newline in pretty mode, a copy of the text at the end) buys
+// nothing.
 std::string write_to_string(const Value& value, bool pretty) {
-    Serializer serializer;
-    serializer.pretty_print(pretty);
-    detail::StringStream text;
-    serializer.write(text, value);
-    return text.take();
+    std::string text;
+    detail::OutputBuffer buffer(text);
+    detail::WriteVisitor record(buffer, pretty, 0);
+    boost::apply_visitor(record, value);
+    buffer.flush();
+    return text;
 }
 
 } // namespace

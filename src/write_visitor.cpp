@@ -162,7 +162,8 @@ class WriteVisitor::ContainerWriter {
             record.write_bytes("null", 4);
             break;
         default:
-            boost::apply_visitor(WriteVisitor(record.buffer, record.pretty, level), value);
+            // A scalar's text does not depend on its level: the record itself writes it.
+            boost::apply_visitor(record, value);
         }
     }
 
@@ -171,7 +172,7 @@ class WriteVisitor::ContainerWriter {
 };
 
 WriteVisitor::WriteVisitor(OutputBuffer& buffer, bool pretty, int indent)
-    : buffer(buffer), out(buffer.stream()), pretty(pretty), indent(indent) {}
+    : buffer(buffer), pretty(pretty), indent(indent) {}
 
 void WriteVisitor::operator()(const Null&) const {
     write_bytes("null", 4);
@@ -206,7 +207,7 @@ void WriteVisitor::write_string(const std::string& text) const {
         }
         const char escape = ESCAPES[static_cast<unsigned char>(*byte)];
         if (escape == 'u') {
-            write_unicode_escape(static_cast<unsigned char>(*byte));
+            buffer.unicode_escape(static_cast<unsigned char>(*byte));
         } else {
             const char pair[2] = {'\\', escape};
             write_bytes(pair, 2);
@@ -243,11 +244,8 @@ void WriteVisitor::write_number_text(Number number, int (*format)(char*, Number)
     }
 }
 
-// What std::endl does: the widened '\n', then a flush, with every byte before it delivered.
 void WriteVisitor::new_line() const {
-    buffer.put(buffer.newline());
-    buffer.flush();
-    out.flush();
+    buffer.new_line();
 }
 
 void WriteVisitor::write_indent(int count) const {
@@ -259,17 +257,40 @@ void WriteVisitor::write_indent(int count) const {
     }
 }
 
-// \u and four hex digits through the stream's own formatting. The fill character is left at
-// '0' afterwards; the format flags are restored once the digits are out.
-void WriteVisitor::write_unicode_escape(unsigned char byte) const {
-    const std::ios_base::fmtflags saved = out.flags();
-    write_bytes("\\u", 2);
-    buffer.flush(); // the digits come from the stream itself
-    out.width(4);
-    out.fill('0');
-    out.setf(std::ios_base::hex, std::ios_base::basefield);
-    out << static_cast<int>(byte);
-    out.flags(saved);
+void OutputBuffer::new_line() {
+    if (out == nullptr) {
+        put(widened_newline);
+        return;
+    }
+    if (!widened_newline_known) {
+        // widen() throws std::bad_cast for a locale without std::ctype<char>: the text so far
+        // must be on the stream by then. Once it has answered, its answer is reused.
+        flush();
+        widened_newline = out->widen('\n');
+        widened_newline_known = true;
+    }
+    put(widened_newline);
+    flush();
+    out->flush();
+}
+
+// On a stream: \u, then the digits from the stream's own formatting, with its flags restored
+// afterwards and its fill character left at '0'. In a string: what a default stream writes.
+void OutputBuffer::unicode_escape(unsigned char byte) {
+    if (out == nullptr) {
+        static constexpr char HEX[] = "0123456789abcdef";
+        const char escape[6] = {'\\', 'u', '0', '0', HEX[byte >> 4], HEX[byte & 0xF]};
+        append(escape, sizeof escape);
+        return;
+    }
+    const std::ios_base::fmtflags saved = out->flags();
+    append("\\u", 2);
+    flush();
+    out->width(4);
+    out->fill('0');
+    out->setf(std::ios_base::hex, std::ios_base::basefield);
+    *out << static_cast<int>(byte);
+    out->flags(saved);
 }
 
 } // namespace json::detail

@@ -10,9 +10,9 @@
 
 namespace json::detail {
 
-/// The writer record of one Serializer::write call: the stream (behind the call's output
-/// buffer), the mode and the nesting level of the value it writes. Applied to a Value with
-/// boost::apply_visitor, it writes the alternative the Value holds.
+/// The writer record of one Serializer::write call: where the text goes (a stream or a
+/// string, behind an OutputBuffer), the mode and the nesting level of the value it writes. Applied
+/// to a Value with boost::apply_visitor, it writes the alternative the Value holds.
 ///
 /// Containers are written from an explicit stack of open containers rather than by applying a
 /// child record recursively, so the call stack stays flat however deep the document is; the
@@ -47,12 +47,10 @@ class WriteVisitor : public boost::static_visitor<void> {
     class ContainerWriter;
 
     void write_bytes(const char* bytes, std::size_t count) const { buffer.append(bytes, count); }
-    void write_unicode_escape(unsigned char byte) const;
     template <typename Number>
     void write_number_text(Number number, int (*format)(char*, Number)) const;
 
     OutputBuffer& buffer;
-    std::ostream& out;
     bool pretty;
     int indent;
 };

@@ -193,6 +193,29 @@ TEST(Serializer, NewlinesAreWidenedByTheStream) {
     EXPECT_EQ(out.str(), "[|    1,|    2|]");
 }
 
+// json::serialize and json::pretty_print give what a Serializer writes into a default
+// std::ostringstream, also when the global locale widens '\n' to something else.
+TEST(Serializer, StringResultsMatchADefaultStringStream) {
+    const Value document =
+        Object{{"text", "tab\t nul\x01 \x1f/"}, {"list", Array{1.5, Array{}, Object{}}}};
+    auto through_stream = [&document](bool pretty) {
+        json::Serializer serializer;
+        serializer.pretty_print(pretty);
+        std::ostringstream out;
+        serializer.write(out, document);
+        return out.str();
+    };
+    const std::locale previous = std::locale::global(std::locale(std::locale(), new PipeNewlines));
+    const std::string compact = json::serialize(document);
+    const std::string pretty = json::pretty_print(document);
+    const std::string compact_expected = through_stream(false);
+    const std::string pretty_expected = through_stream(true);
+    std::locale::global(previous);
+    EXPECT_EQ(compact, compact_expected);
+    EXPECT_EQ(pretty, pretty_expected);
+    EXPECT_NE(pretty.find("{|    \"list\""), std::string::npos) << pretty;
+}
+
 TEST(Serializer, BadStreamReceivesNothingAndExceptionsPropagate) {
     std::ostringstream bad;
     bad.setstate(std::ios_base::badbit);
