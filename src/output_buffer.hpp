@@ -73,7 +73,7 @@ class OutputBuffer {
         }
     }
 
-    static constexpr std::size_t CAPACITY = 16 * 1024;
+    static constexpr std::size_t CAPACITY = std::size_t{16} * 1024;
 
   private:
     void deliver(const char* bytes, std::size_t count) {
