@@ -3,7 +3,8 @@
 # locale tests use. Does nothing when everything is already there.
 set -euo pipefail
 
-packages=(g++ cmake make pkg-config libboost1.81-dev libgtest-dev clang-format clang-tidy locales "$@")
+packages=(g++ cmake make pkg-config libboost1.81-dev libgtest-dev clang-format clang-tidy clang-14 libclang-rt-14-dev
+    valgrind locales "$@")
 
 missing=()
 for package in "${packages[@]}"; do

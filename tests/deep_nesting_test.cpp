@@ -101,6 +101,43 @@ TEST(DeepNesting, ObjectsHundredThousandDeep) {
     expect_every_operation_survives(nested_objects(DEPTH), '{', '}');
 }
 
+std::string nested_array_text(int depth) {
+    return std::string(static_cast<std::size_t>(depth), '[') +
+           std::string(static_cast<std::size_t>(depth), ']');
+}
+
+std::string nested_object_text(int depth) {
+    std::string text;
+    for (int level = 0; level < depth; ++level) {
+        text += R"({"k":)";
+    }
+    return text + "{}" + std::string(static_cast<std::size_t>(depth), '}');
+}
+
+// Deep texts are refused by the default depth limit and parsed, written and released once the
+// limit allows them: the parser keeps its open containers on the heap, not the call stack.
+TEST(DeepNesting, TextsTenThousandAndAMillionDeep) {
+    for (int depth : {10'000, 1'000'000}) {
+        for (const std::string& text : {nested_array_text(depth), nested_object_text(depth)}) {
+            Value out;
+            const json::ParseReport refused = json::parse(text, out, {});
+            EXPECT_TRUE(refused.too_deep) << depth;
+            EXPECT_EQ(refused.offset, text[0] == '[' ? 512u : 512u * 5);
+            const auto limit = static_cast<std::size_t>(depth) + 1;
+            ASSERT_TRUE(json::parse(text, out, json::ParseOptions{limit})) << depth;
+            EXPECT_EQ(json::serialize(out), text);
+        }
+    }
+}
+
+TEST(DeepNesting, AMillionLevelsBuiltInALoop) {
+    constexpr int depth = 1'000'000;
+    const Value arrays = nested_arrays(depth);
+    EXPECT_EQ(json::serialize(arrays), nested_array_text(depth));
+    const Value objects = nested_objects(depth);
+    EXPECT_EQ(json::serialize(objects).size(), std::size_t{2} * depth + 4u * (depth - 1));
+}
+
 TEST(DeepNesting, DifferentDeepTreesCompareUnequal) {
     Value left = nested_arrays(DEPTH);
     Value right = nested_arrays(DEPTH);

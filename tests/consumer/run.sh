@@ -1,6 +1,7 @@
 #!/usr/bin/env bash
-# Installs the build tree into a fresh prefix, then builds and runs the consumer project
-# against it with find_package, without LD_LIBRARY_PATH.
+# Installs the build tree into a fresh prefix, then builds the consumer program against it
+# twice, with CMake's find_package and with pkg-config and plain g++, and runs both without
+# LD_LIBRARY_PATH: the installed libraries find each other through their RUNPATH.
 set -euo pipefail
 build_dir=$1
 consumer_dir=$2
@@ -8,6 +9,15 @@ work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
 
 cmake --install "$build_dir" --prefix "$work/prefix" >/dev/null
-cmake -S "$consumer_dir" -B "$work/build" -DCMAKE_PREFIX_PATH="$work/prefix" >/dev/null
-cmake --build "$work/build" >/dev/null
-env -u LD_LIBRARY_PATH "$work/build/consumer"
+libdir=$(find "$work/prefix" -name 'jsonvalue.pc' -printf '%h')/..
+
+cmake -S "$consumer_dir" -B "$work/cmake-build" -DCMAKE_PREFIX_PATH="$work/prefix" >/dev/null
+cmake --build "$work/cmake-build" >/dev/null
+env -u LD_LIBRARY_PATH "$work/cmake-build/consumer"
+
+export PKG_CONFIG_PATH="$libdir/pkgconfig"
+# shellcheck disable=SC2046 # the flags are meant to split
+g++ -o "$work/pkg-config-consumer" "$consumer_dir/main.cpp" $(pkg-config --cflags --libs jsonvalue)
+env -u LD_LIBRARY_PATH "$work/pkg-config-consumer"
+
+"$work/prefix/bin/jsonfmt" --version
