@@ -4,7 +4,7 @@
 set -euo pipefail
 
 packages=(g++ cmake make pkg-config libboost1.81-dev libgtest-dev clang-format clang-tidy clang-14 libclang-rt-14-dev
-    valgrind locales "$@")
+    valgrind dpkg-dev doxygen locales "$@")
 
 missing=()
 for package in "${packages[@]}"; do

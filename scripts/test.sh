@@ -28,6 +28,9 @@ run_build release -DCMAKE_BUILD_TYPE=Release -DCMAKE_EXPORT_COMPILE_COMMANDS=ON
 echo "== clang-tidy"
 scripts/tidy.sh build/release
 
+echo "== API reference (any Doxygen warning fails)"
+cmake --build build/release --target docs
+
 echo "== ThreadSanitizer"
 cmake -S . -B build/tsan -DCMAKE_BUILD_TYPE=RelWithDebInfo -DJSONVALUE_TSAN=ON \
     -DJSONVALUE_BUILD_EXAMPLES=OFF >/dev/null
@@ -45,6 +48,9 @@ find build/release/tests -maxdepth 1 -type f -executable -name '*_test' | sort |
         --gtest_filter=-DeepNesting.*HundredThousandDeep >"$1.valgrind" 2>&1 ||
         { cat "$1.valgrind"; echo "valgrind: $1 failed"; exit 255; }' _ {}
 echo "valgrind: no error and no leak"
+
+echo "== Debian package"
+tests/package/check_deb.sh build/release tests/consumer
 
 echo "== fuzzing"
 scripts/fuzz.sh 60

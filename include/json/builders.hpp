@@ -62,6 +62,7 @@ class JSONVALUE_API Property {
     /// is never ambiguous between a string value and a Property.
     explicit Property(const std::string& name);
 
+    /// A copy: the same name and copies of the members.
     Property(const Property& other) = default;
 
     /// Sets the member `name` to a copy of `value`; returns *this. On std::bad_alloc a member

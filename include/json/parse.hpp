@@ -65,13 +65,14 @@ struct ParseOptions {
 /// The detailed outcome of json::parse: the code, and for a failure where it happened and,
 /// when the code alone says too little, a plain note on why.
 struct ParseReport {
-    ParseResult result = ParseResult::SUCCESS;
-    std::size_t offset = 0;     ///< byte offset of the failure in the text
-    std::size_t line = 0;       ///< 1-based line of the failure (0 on success)
-    std::size_t column = 0;     ///< 1-based column, counted in bytes (0 on success)
+    ParseResult result = ParseResult::SUCCESS; ///< the outcome
+    std::size_t offset = 0;                    ///< byte offset of the failure in the text
+    std::size_t line = 0;                      ///< 1-based line of the failure (0 on success)
+    std::size_t column = 0;                    ///< 1-based column, counted in bytes (0 on success)
     const char* note = nullptr; ///< e.g. "the document is nested deeper than the maximum depth"
     bool too_deep = false;      ///< nesting beyond ParseOptions::max_depth was refused
 
+    /// Whether the text parsed.
     explicit operator bool() const { return result == ParseResult::SUCCESS; }
 
     /// The code's description, followed by the note when there is one.

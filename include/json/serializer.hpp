@@ -14,8 +14,9 @@ namespace json {
 /// Text produced:
 /// - numbers in the shortest form that reads back to the same value; NaN and the infinities,
 ///   which JSON cannot express as numbers, as the strings "NaN", "Inf" and "-Inf";
-/// - strings between double quotes with \b \t \n \f \r \" \/ \\ escaped (the slash always),
-///   other bytes below 0x20 as \u00XX through the stream's own number formatting, and every
+/// - strings between double quotes with `\b` `\t` `\n` `\f` `\r` `\"` `\/` `\\` escaped (the
+///   slash always), other bytes below 0x20 as `\u00XX` through the stream's own number
+///   formatting, and every
 ///   other byte unchanged: UTF-8 is not validated, so writing never fails on bad text;
 /// - pretty mode puts every element and member on a line of its own, indented four spaces per
 ///   level, with no space after the colon; every newline is put and flushed as std::endl does;

@@ -65,9 +65,11 @@ struct ShallowCopy {};
 /// for Undefined, Null, bool, double, std::string, Array, Object, float and int only.
 template <typename T>
 struct traits {
+    /// The type's display name, e.g. "JSON number" for double; defined in the library.
     static const char* const name;
 };
 
+/// @cond
 template <>
 JSONVALUE_API const char* const traits<Undefined>::name;
 template <>
@@ -86,6 +88,7 @@ template <>
 JSONVALUE_API const char* const traits<float>::name;
 template <>
 JSONVALUE_API const char* const traits<int>::name;
+/// @endcond
 
 /// A JSON value: exactly one of the eight alternatives of detail::ValueVariant.
 ///
@@ -103,15 +106,24 @@ class JSONVALUE_API Value : public detail::ValueVariant {
     /// Holds Undefined. Throws nothing.
     Value() = default;
 
-    /// One constructor per alternative; the Value holds a (deep) copy of the argument.
-    /// Strings and containers may throw std::bad_alloc; nothing is left behind.
+    // One constructor per alternative; the Value holds a (deep) copy of the argument. Strings
+    // and containers may throw std::bad_alloc; nothing is left behind.
+
+    /// Holds Undefined.
     Value(const Undefined& tag) : detail::ValueVariant(tag) {}
+    /// Holds JSON null.
     Value(const Null& tag) : detail::ValueVariant(tag) {}
+    /// Holds a boolean.
     Value(const bool& boolean) : detail::ValueVariant(boolean) {}
+    /// Holds a double-precision number.
     Value(const double& number) : detail::ValueVariant(number) {}
+    /// Holds a copy of the string.
     Value(const std::string& text) : detail::ValueVariant(text) {}
+    /// Holds a deep copy of the array.
     Value(const Array& items);
+    /// Holds a deep copy of the object.
     Value(const Object& members);
+    /// Holds a single-precision number (alternative 7, never converted to double).
     Value(const float& number) : detail::ValueVariant(number) {}
 
     /// A string (alternative 4), never the bool that a pointer would otherwise convert to.
