@@ -7,7 +7,6 @@
 #include <cstdint>
 #include <cstring>
 #include <limits>
-#include <string_view>
 #include <vector>
 
 namespace json::detail {

@@ -5,7 +5,6 @@
 
 #include <json/value.hpp>
 
-#include <ostream>
 #include <string>
 
 namespace json::detail {

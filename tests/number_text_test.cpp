@@ -3,7 +3,6 @@
 
 #include <gtest/gtest.h>
 
-#include <clocale>
 #include <cmath>
 #include <cstring>
 #include <limits>
@@ -78,15 +77,6 @@ TEST(NumberText, OutOfRangeReadsLikeStrtod) {
     EXPECT_EQ(convertStrToDouble("100000e-329"), 0.0) << "1e-324";
     EXPECT_EQ(convertStrToDouble("4.9e-324"), 5e-324) << "subnormals are in range";
     EXPECT_EQ(convertStrToDouble("not a number"), 0.0);
-}
-
-TEST(NumberText, IndependentOfTheGlobalLocale) {
-    if (std::setlocale(LC_ALL, "de_DE.UTF-8") == nullptr) {
-        GTEST_SKIP() << "locale de_DE.UTF-8 is not installed";
-    }
-    EXPECT_EQ(double_text(0.5), "0.5");
-    EXPECT_EQ(convertStrToDouble("0.5"), 0.5);
-    std::setlocale(LC_ALL, "C");
 }
 
 } // namespace
