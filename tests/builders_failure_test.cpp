@@ -16,8 +16,6 @@ using json::Property;
 using json::Value;
 using test_support::for_each_failing_allocation;
 
-const Value warm_up = Value(Value(Array{Object{}}));
-
 const Value big = Array{"a string long enough for its own allocation", Object{{"k", Array{1}}}};
 
 Value element_items(const Element& element) {

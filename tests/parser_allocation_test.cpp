@@ -12,8 +12,6 @@ using json::Value;
 using test_support::allocations_made;
 using test_support::for_each_failing_allocation;
 
-const Value warm_up = Value(Value(json::Array{json::Object{}}));
-
 std::size_t allocations_to_parse(const std::string& text, const json::ParseOptions& options) {
     Value out;
     const std::size_t before = allocations_made();

@@ -12,10 +12,6 @@ using json::Object;
 using json::Value;
 using test_support::for_each_failing_allocation;
 
-// The library makes two constant empty containers on the first copy of a container and keeps
-// them until exit; make them before any test counts blocks.
-const Value warm_up = Value(Value(Array{Object{}}));
-
 Value sample_document() {
     return Array{Object{{"name", "a string longer than the small-string buffer"},
                         {"list", Array{1, Array{2, Object{{"x", nullptr}}}, "three"}}},
