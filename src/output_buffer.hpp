@@ -1,6 +1,7 @@
 #ifndef JSON_SRC_OUTPUT_BUFFER_HPP
 #define JSON_SRC_OUTPUT_BUFFER_HPP
 
+#include <algorithm>
 #include <cstddef>
 #include <cstring>
 #include <ostream>
@@ -46,6 +47,19 @@ class OutputBuffer {
             flush();
         }
         data[used++] = c;
+    }
+
+    /// `count` copies of `c`, filled straight into the buffer a piece at a time.
+    void fill(char c, std::size_t count) {
+        while (count != 0) {
+            if (used == CAPACITY) {
+                flush();
+            }
+            const std::size_t piece = std::min(count, CAPACITY - used);
+            std::memset(data + used, c, piece);
+            used += piece;
+            count -= piece;
+        }
     }
 
     /// Room for at least `count` bytes (at most CAPACITY), flushing first when needed; the

@@ -248,11 +248,8 @@ void WriteVisitor::new_line() const {
 }
 
 void WriteVisitor::write_indent(int count) const {
-    // Deep documents indent by thousands of spaces: write them in large pieces.
-    static const std::string spaces(1024, ' ');
-    const int chunk = static_cast<int>(spaces.size());
-    for (; count > 0; count -= chunk) {
-        write_bytes(spaces.data(), static_cast<std::size_t>(count < chunk ? count : chunk));
+    if (count > 0) {
+        buffer.fill(' ', static_cast<std::size_t>(count));
     }
 }
 
