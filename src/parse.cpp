@@ -3,6 +3,9 @@
 #include <codecvt_ustring_to_string.hpp>
 #include <number_text.hpp>
 
+#include <array>
+#include <istream>
+#include <new>
 #include <stdexcept>
 
 namespace json {
@@ -65,5 +68,39 @@ std::string u16_to_u8(char16_t* text, int count) {
 }
 
 } // namespace detail
+
+ParseReport parse(std::istream& in, Value& out, const ParseOptions& options) {
+    std::string text;
+    bool read_whole = false;
+    const std::istream::sentry ready(in, true); // whitespace is the parser's business
+    if (ready) {
+        try {
+            // xsgetn reads until it has the count or the buffer is exhausted: a short count
+            // is the end of the stream.
+            std::array<char, std::size_t{64} * 1024> chunk;
+            std::streamsize got = 0;
+            do {
+                got = in.rdbuf()->sgetn(chunk.data(), static_cast<std::streamsize>(chunk.size()));
+                text.append(chunk.data(), static_cast<std::size_t>(got));
+            } while (got == static_cast<std::streamsize>(chunk.size()));
+            read_whole = true;
+        } catch (const std::bad_alloc&) {
+            throw;
+        } catch (...) {
+            in.setstate(std::ios::badbit); // throws if the caller asked for that
+        }
+        in.setstate(read_whole ? std::ios::eofbit | std::ios::failbit : std::ios::goodbit);
+    } else {
+        read_whole = !in.bad(); // at the end already: an empty text
+    }
+    if (!read_whole) {
+        ParseReport report;
+        report.result = ParseResult::UNEXPECTED_END_OF_INPUT;
+        report.note = "the stream failed while it was read";
+        detail::locate(report, text, text.size());
+        return report;
+    }
+    return parse(text, out, options);
+}
 
 } // namespace json

@@ -49,20 +49,18 @@ Value& child_value(Object::value_type& member) {
     return member.second;
 }
 
-// What a shallow copy of `source` copies: `source` itself, or for a container a constant
-// variant holding an empty one of its kind (made on first use, kept until exit). Copying that
-// variant costs one allocation; a prvalue variant would not do, since initialising a base class
-// from one moves it, and moving a recursive_wrapper allocates once more.
-const detail::ValueVariant& shallow_source(const Value& source) {
-    static const detail::ValueVariant empty_array{Array()};
-    static const detail::ValueVariant empty_object{Object()};
+// The variant of a shallow copy of `source`: its scalar or string, or an empty container of its
+// kind. Returned as a prvalue, it initialises a Value's base in place (guaranteed copy
+// elision), so an empty container costs exactly one allocation and nothing is built ahead of
+// use.
+detail::ValueVariant shallow_copy_of(const Value& source) {
     switch (source.which()) {
     case ARRAY_INDEX:
-        return empty_array;
+        return detail::ValueVariant(Array());
     case OBJECT_INDEX:
-        return empty_object;
+        return detail::ValueVariant(Object());
     default:
-        return source;
+        return static_cast<const detail::ValueVariant&>(source);
     }
 }
 
@@ -186,8 +184,14 @@ Value::Value(const Array& items) : detail::ValueVariant(items) {}
 
 Value::Value(const Object& members) : detail::ValueVariant(members) {}
 
+// The variant constructs its recursive_wrapper in place from the moved container: one
+// allocation for the container object, none for its elements.
+Value::Value(Array&& items) : detail::ValueVariant(std::move(items)) {}
+
+Value::Value(Object&& members) : detail::ValueVariant(std::move(members)) {}
+
 Value::Value(detail::ShallowCopy, const Value& other)
-    : detail::ValueVariant(shallow_source(other)) {}
+    : detail::ValueVariant(shallow_copy_of(other)) {}
 
 Value::Value(const Value& other) : Value(detail::ShallowCopy{}, other) {
     if (is_container(other) && !is_empty_container(other)) {
@@ -223,16 +227,74 @@ Value& Value::operator=(const Value& source) {
     try {
         target = static_cast<const detail::ValueVariant&>(source);
     } catch (...) {
-        if (which() == detail::BOOL_INDEX) {
-            // boost::variant fell back to bool, constructed without a value.
+        // Only a container or a string copy can fail. A container is built in place after the
+        // old content is gone, so boost::variant fell back to a bool without a value; a string
+        // is copied before the target changes, so the target is as it was but for the content
+        // set aside. (Testing for index 2 instead would also hit a target that was a bool.)
+        if (is_container(source)) {
             boost::get<bool>(*this) = false;
         } else {
-            // A string source is copied before the target changes: give the content back.
             detach_container(*this, old_items, old_members);
         }
         throw;
     }
     return *this;
+}
+
+namespace {
+
+// Moves what `from` holds into `to` without copying it; `from` is left with an empty
+// container or string, or its scalar. Whatever `to` held is released. Allocates only when `to`
+// must take a container of another alternative (an empty one, then swapped with `from`'s); on
+// std::bad_alloc `from` is unchanged.
+void move_content(Value& from, Value& to) {
+    if (is_container(from)) {
+        if (to.which() != from.which()) {
+            to = Value(detail::ShallowCopy{}, from);
+        }
+        static_cast<detail::ValueVariant&>(to).swap(from);
+    } else {
+        // Scalars and strings move without allocating.
+        static_cast<detail::ValueVariant&>(to) =
+            std::move(static_cast<detail::ValueVariant&>(from));
+    }
+}
+
+// Undoes a step of a failed swap. If even that cannot allocate, `to` holds false and the
+// content is released with `from`: a Value never ends up holding the other's content.
+void put_back(Value& from, Value& to) noexcept {
+    try {
+        move_content(from, to);
+    } catch (...) {
+        to = Value(false);
+    }
+}
+
+} // namespace
+
+void Value::swap(Value& other) {
+    detail::ValueVariant& mine = *this;
+    if (which() == other.which() || (!is_container(*this) && !is_container(other))) {
+        // Same alternative: the contents (wrapper pointers, string buffers) are exchanged.
+        // Otherwise boost::variant moves scalars and strings through a temporary.
+        mine.swap(other);
+        return;
+    }
+    Value held;
+    move_content(*this, held);
+    try {
+        move_content(other, *this);
+    } catch (...) {
+        put_back(held, *this);
+        throw;
+    }
+    try {
+        move_content(held, other);
+    } catch (...) {
+        put_back(*this, other);
+        put_back(held, *this);
+        throw;
+    }
 }
 
 Value::~Value() {
@@ -245,75 +307,90 @@ Value::~Value() {
 
 namespace {
 
+using PendingPairs = std::vector<std::pair<const Value*, const Value*>>;
+
 template <typename Alternative>
 bool same_content(const Value& left, const Value& right) {
     return boost::get<Alternative>(left) == boost::get<Alternative>(right);
 }
 
+// Whether two Values are equal as far as can be told without looking at children: the same
+// alternative and equal scalars or strings, or containers of the same size.
+bool shallow_equal(const Value& a, const Value& b) {
+    if (a.which() != b.which()) {
+        return false;
+    }
+    switch (a.which()) {
+    case detail::UNDEFINED_INDEX:
+    case detail::NULL_INDEX:
+        return true;
+    case detail::BOOL_INDEX:
+        return same_content<bool>(a, b);
+    case detail::DOUBLE_INDEX:
+        return same_content<double>(a, b);
+    case detail::FLOAT_INDEX:
+        return same_content<float>(a, b);
+    case detail::STRING_INDEX:
+        return same_content<std::string>(a, b);
+    case ARRAY_INDEX:
+        return boost::get<Array>(a).size() == boost::get<Array>(b).size();
+    case OBJECT_INDEX:
+        return boost::get<Object>(a).size() == boost::get<Object>(b).size();
+    default:
+        std::abort();
+    }
+}
+
+// Compares the children of two containers of the same kind and size; pairs of non-empty
+// containers among them are noted in `nested` to be compared later, not descended into.
+bool children_equal(const Value& a, const Value& b, PendingPairs& nested) {
+    const auto note = [&nested](const Value& x, const Value& y) {
+        if (!shallow_equal(x, y)) {
+            return false;
+        }
+        if (is_container(x) && !is_empty_container(x)) {
+            nested.emplace_back(&x, &y);
+        }
+        return true;
+    };
+    if (a.which() == ARRAY_INDEX) {
+        const Array& y = boost::get<Array>(b);
+        auto j = y.begin();
+        for (const Value& x : boost::get<Array>(a)) {
+            if (!note(x, *j++)) {
+                return false;
+            }
+        }
+        return true;
+    }
+    const Object& y = boost::get<Object>(b);
+    auto j = y.begin();
+    for (const auto& [key, x] : boost::get<Object>(a)) {
+        if (key != j->first || !note(x, j->second)) {
+            return false;
+        }
+        ++j;
+    }
+    return true;
+}
+
 } // namespace
 
 bool operator==(const Value& left, const Value& right) {
-    std::vector<std::pair<const Value*, const Value*>> pending{{&left, &right}};
-    while (!pending.empty()) {
-        const auto [a, b] = pending.back();
-        pending.pop_back();
-        if (a->which() != b->which()) {
-            return false;
-        }
-        switch (a->which()) {
-        case detail::UNDEFINED_INDEX:
-        case detail::NULL_INDEX:
-            break;
-        case detail::BOOL_INDEX:
-            if (!same_content<bool>(*a, *b)) {
-                return false;
-            }
-            break;
-        case detail::DOUBLE_INDEX:
-            if (!same_content<double>(*a, *b)) {
-                return false;
-            }
-            break;
-        case detail::FLOAT_INDEX:
-            if (!same_content<float>(*a, *b)) {
-                return false;
-            }
-            break;
-        case detail::STRING_INDEX:
-            if (!same_content<std::string>(*a, *b)) {
-                return false;
-            }
-            break;
-        case ARRAY_INDEX: {
-            const Array& x = boost::get<Array>(*a);
-            const Array& y = boost::get<Array>(*b);
-            if (x.size() != y.size()) {
-                return false;
-            }
-            for (std::size_t i = 0; i < x.size(); ++i) {
-                pending.emplace_back(&x[i], &y[i]);
-            }
-            break;
-        }
-        case OBJECT_INDEX: {
-            const Object& x = boost::get<Object>(*a);
-            const Object& y = boost::get<Object>(*b);
-            if (x.size() != y.size()) {
-                return false;
-            }
-            for (auto i = x.begin(), j = y.begin(); i != x.end(); ++i, ++j) {
-                if (i->first != j->first) {
-                    return false;
-                }
-                pending.emplace_back(&i->second, &j->second);
-            }
-            break;
-        }
-        default:
-            std::abort();
-        }
+    if (!shallow_equal(left, right)) {
+        return false;
     }
-    return true;
+    if (!is_container(left)) {
+        return true;
+    }
+    PendingPairs nested; // allocates only once a nested container turns up
+    bool equal = children_equal(left, right, nested);
+    while (equal && !nested.empty()) {
+        const auto [a, b] = nested.back();
+        nested.pop_back();
+        equal = children_equal(*a, *b, nested);
+    }
+    return equal;
 }
 
 } // namespace json

@@ -4,7 +4,9 @@
 #include <json/detail/export.hpp>
 #include <json/value.hpp>
 
+#include <algorithm>
 #include <cstddef>
+#include <istream>
 #include <string>
 #include <string_view>
 
@@ -85,6 +87,19 @@ struct ParseReport {
     }
 };
 
+namespace detail {
+
+/// Sets the offset, line and column of a failure at `offset` in `text`.
+inline void locate(ParseReport& report, std::string_view text, std::size_t offset) {
+    report.offset = offset;
+    const std::string_view before = text.substr(0, offset);
+    const std::size_t line_start = before.rfind('\n');
+    report.line = 1 + static_cast<std::size_t>(std::count(before.begin(), before.end(), '\n'));
+    report.column = offset - (line_start == std::string_view::npos ? 0 : line_start + 1) + 1;
+}
+
+} // namespace detail
+
 } // namespace json
 
 #include <json/detail/parser.hpp>
@@ -105,23 +120,30 @@ namespace json {
 ///   MISSING_TRAILING_BRACE and `too_deep` set.
 /// - Text after the value is refused with UNEXPECTED_END_OF_INPUT and a note saying so.
 ///
-/// Throws std::bad_alloc, leaving `out` as it was.
+/// Throws std::bad_alloc. When one allocation fails, `out` is left as it was. Handing the
+/// document over costs one allocation when `out` must change to an Array or Object from
+/// another alternative, and putting its old content back after a failure costs one more: only
+/// if memory stays exhausted for both does `out` end up holding `false`, its old content
+/// released (never any part of the new document).
 inline ParseReport parse(std::string_view text, Value& out, const ParseOptions& options) {
     detail::Parser parser(text, options.max_depth);
     ParseReport report;
     report.result = parser.run(out);
     if (report.result != ParseResult::SUCCESS) {
-        report.offset = parser.failure_offset();
         report.note = parser.note();
         report.too_deep = parser.nesting_too_deep();
-        const std::string_view before = text.substr(0, report.offset);
-        const std::size_t line_start = before.rfind('\n');
-        report.line = 1 + static_cast<std::size_t>(std::count(before.begin(), before.end(), '\n'));
-        report.column =
-            report.offset - (line_start == std::string_view::npos ? 0 : line_start + 1) + 1;
+        detail::locate(report, text, parser.failure_offset());
     }
     return report;
 }
+
+/// Reads the rest of `in` and parses it as the text overload does, with the same report and
+/// the same guarantees for `out`. A stream that fails while it is read (its buffer throws, or
+/// it was bad from the start) is a failure too, UNEXPECTED_END_OF_INPUT with the note "the
+/// stream failed while it was read" at the offset reached, and `out` is left as it was.
+/// Exceptions the caller enabled on the stream for badbit propagate; failbit and eofbit are
+/// set at the end of the stream without an exception. Memory: the whole text is held at once.
+JSONVALUE_API ParseReport parse(std::istream& in, Value& out, const ParseOptions& options);
 
 /// Parses as above with the default options and returns the code alone.
 inline ParseResult parse(std::string_view text, Value& out) {

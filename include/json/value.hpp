@@ -8,7 +8,9 @@
 #include <cstddef>
 #include <map>
 #include <string>
+#include <string_view>
 #include <type_traits>
+#include <utility>
 #include <vector>
 
 namespace json {
@@ -126,6 +128,18 @@ class JSONVALUE_API Value : public detail::ValueVariant {
     /// Holds a single-precision number (alternative 7, never converted to double).
     Value(const float& number) : detail::ValueVariant(number) {}
 
+    // Constructors that take a container or string over instead of copying it: these are
+    // conversions from an alternative, not move operations of Value.
+
+    /// Holds the array's elements, taken over without copying them: one allocation for the
+    /// Array itself. `items` is left empty. On std::bad_alloc `items` keeps its elements.
+    Value(Array&& items);
+    /// Holds the object's members, taken over without copying them: one allocation for the
+    /// Object itself. `members` is left empty. On std::bad_alloc `members` keeps its members.
+    Value(Object&& members);
+    /// Holds the string's characters, taken over without copying them. Throws nothing.
+    Value(std::string&& text) noexcept : detail::ValueVariant(std::move(text)) {}
+
     /// A string (alternative 4), never the bool that a pointer would otherwise convert to.
     /// `text` must point to NUL-terminated text.
     Value(const char* text) : detail::ValueVariant(std::string(text)) {}
@@ -161,12 +175,111 @@ class JSONVALUE_API Value : public detail::ValueVariant {
 
     /// Releases the whole tree. Throws nothing.
     ~Value();
+
+    /// Exchanges the contents of the two Values without copying either tree: constant time,
+    /// whatever they hold. Allocates nothing when both hold the same alternative (two Arrays,
+    /// two Objects, ...) or neither holds an Array or Object. Otherwise a Value that takes an
+    /// Array or Object gets a new empty one, into which the content is then swapped: a
+    /// container cannot change owner between Values of different alternatives. If that
+    /// allocation fails, std::bad_alloc passes on and both Values are as they were; only if
+    /// memory stays exhausted, so that a Value's own container cannot be put back either, does
+    /// that Value end up holding `false` with its content released, as after a failed
+    /// container assignment.
+    void swap(Value& other);
+
+    /// @name Kind queries
+    /// Which kind of JSON value this is. Throw nothing.
+    /// @{
+    bool is_undefined() const noexcept { return which() == detail::UNDEFINED_INDEX; }
+    bool is_null() const noexcept { return which() == detail::NULL_INDEX; }
+    bool is_bool() const noexcept { return which() == detail::BOOL_INDEX; }
+    /// A double or a float.
+    bool is_number() const noexcept {
+        return which() == detail::DOUBLE_INDEX || which() == detail::FLOAT_INDEX;
+    }
+    bool is_string() const noexcept { return which() == detail::STRING_INDEX; }
+    bool is_array() const noexcept { return which() == detail::ARRAY_INDEX; }
+    bool is_object() const noexcept { return which() == detail::OBJECT_INDEX; }
+    /// @}
+
+    /// @name Checked access
+    /// The value held, of the kind asked for. Constant time. Throw std::invalid_argument when
+    /// the Value holds another kind, naming both: "expected JSON number, found JSON string".
+    /// @{
+    bool as_bool() const;
+    /// A double, or a float widened to double.
+    double as_number() const;
+    std::string& as_string();
+    const std::string& as_string() const;
+    Array& as_array();
+    const Array& as_array() const;
+    Object& as_object();
+    const Object& as_object() const;
+    /// @}
+
+    /// @name Lookups
+    /// None of them inserts anything, and none allocates except to build a std::string key
+    /// from a longer text.
+    /// @{
+
+    /// The member named `key`, or null when this is no Object or has no such member.
+    /// Logarithmic in the number of members. Throws nothing.
+    Value* find(const std::string& key) noexcept;
+    /// The member named `key`, or null when this is no Object or has no such member.
+    /// Logarithmic in the number of members. Throws nothing.
+    const Value* find(const std::string& key) const noexcept;
+    /// Whether this is an Object with a member named `key`. Throws nothing.
+    bool contains(const std::string& key) const noexcept { return find(key) != nullptr; }
+
+    /// The member named `key`. Logarithmic. Throws std::out_of_range naming the key when there
+    /// is no such member, std::invalid_argument when this is no Object.
+    Value& at(const std::string& key);
+    /// @copydoc at(const std::string&)
+    const Value& at(const std::string& key) const;
+    /// The element at `index`. Constant time. Throws std::out_of_range naming the index and the
+    /// size when it is out of range, std::invalid_argument when this is no Array.
+    Value& at(std::size_t index);
+    /// @copydoc at(std::size_t)
+    const Value& at(std::size_t index) const;
+
+    /// The value that the JSON Pointer (RFC 6901) `pointer` refers to, or null when there is
+    /// none. "" is this Value itself; each "/token" goes one level down, into the member of
+    /// that name (with "~1" standing for '/' and "~0" for '~') or the element at that index
+    /// (decimal digits, no leading zero; "-" refers to no element). Linear in the length of
+    /// the pointer, logarithmic per Object. Throws std::invalid_argument when the pointer is
+    /// malformed: not empty and not starting with '/', or with '~' not followed by '0' or '1'.
+    Value* find_pointer(std::string_view pointer);
+    /// @copydoc find_pointer
+    const Value* find_pointer(std::string_view pointer) const;
+    /// The value that `pointer` refers to, as find_pointer finds it. Throws
+    /// std::out_of_range when there is none, with a message that begins with the pointer up to
+    /// the first token not found ("/servers/3: index 3 out of range for a JSON array of 2
+    /// elements"), and std::invalid_argument when the pointer is malformed.
+    Value& at_pointer(std::string_view pointer);
+    /// @copydoc at_pointer
+    const Value& at_pointer(std::string_view pointer) const;
+    /// @}
+
+    /// The member named `key` converted with json::value_to<T> (json/convert.hpp), or
+    /// `fallback` when there is no such member or it holds Undefined. A member that does not
+    /// convert throws as value_to does, with "/key" at the start of the message: it is never
+    /// replaced by the fallback. Throws std::invalid_argument when this is no Object.
+    template <typename T>
+    T value_or(const std::string& key, const T& fallback) const;
 };
+
+/// Exchanges two Values as Value::swap does; found by argument-dependent lookup, so that
+/// `using std::swap; swap(a, b);` and the standard algorithms that swap (std::reverse,
+/// std::iter_swap) never copy a tree.
+inline void swap(Value& left, Value& right) {
+    left.swap(right);
+}
 
 /// Deep comparison: equal alternatives and equal content. double and float compare by value,
 /// so NaN is unequal to itself; Undefined equals Undefined and Null equals Null. Complexity:
-/// linear in the size of the smaller tree. Throws std::bad_alloc only when its work list
-/// cannot grow.
+/// linear in the size of the smaller tree. Allocates nothing for scalars, strings and
+/// containers of scalars and strings; nested containers go on a work list, which throws
+/// std::bad_alloc if it cannot grow.
 JSONVALUE_API bool operator==(const Value& left, const Value& right);
 
 /// The negation of operator==.
@@ -192,5 +305,8 @@ bool operator!=(const Value& left, const T& right) {
 }
 
 } // namespace json
+
+// Value::value_or converts with value_to.
+#include <json/convert.hpp>
 
 #endif

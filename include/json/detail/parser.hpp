@@ -37,29 +37,6 @@ void adopt(Value& child, Place place) {
     }
 }
 
-/// Gives `out` the content of `document` without copying it. Strong guarantee: changing
-/// `out`'s alternative to a container needs one allocation; if it fails, `out` gets its old
-/// content back (which, for a container of the other kind, needs one allocation too).
-inline void hand_over(Value& document, Value& out) {
-    if (document.which() != ARRAY_INDEX && document.which() != OBJECT_INDEX &&
-        document.which() != STRING_INDEX) {
-        out = document; // a scalar: cannot fail
-        return;
-    }
-    if (out.which() != document.which()) {
-        Value previous; // out's content, set aside without copying
-        adopt(out, [&previous](const auto& empty) -> Value& { return previous = empty; });
-        try {
-            adopt(document, [&out](const auto& empty) -> Value& { return out = empty; });
-        } catch (...) {
-            adopt(previous, [&out](const auto& empty) -> Value& { return out = empty; });
-            throw;
-        }
-        return;
-    }
-    adopt(document, [&out](const auto&) -> Value& { return out; });
-}
-
 /// One parse of one text. Iterative: open containers live on explicit stacks, so the depth a
 /// document may have is limited by ParseOptions::max_depth alone, never by the call stack.
 class Parser {
@@ -142,7 +119,7 @@ inline ParseResult Parser::run(Value& out) {
                 return fail(ParseResult::UNEXPECTED_END_OF_INPUT,
                             "the text goes on after the JSON value");
             }
-            hand_over(values.back(), out);
+            out.swap(values.back()); // the document changes owner without a copy
             return ParseResult::SUCCESS;
         }
         skip_whitespace();
