@@ -168,8 +168,8 @@ enum class Category {
     INTEGER,    // any other integral type
     FLOATING,   // float, double, long double
     STRING,     // std::string
-    TEXT,       // const char*, char arrays, std::string_view: value_from only
     NULLPTR,    // std::nullptr_t
+    TEXT,       // const char*, char arrays, std::string_view: value_from only
     OPTIONAL,   // std::optional
     ENUM,       // described enums
     STRUCT,     // described structs
@@ -192,10 +192,10 @@ constexpr Category category_of() {
         return Category::FLOATING;
     } else if constexpr (std::is_same_v<T, std::string>) {
         return Category::STRING;
+    } else if constexpr (std::is_same_v<T, std::nullptr_t>) {
+        return Category::NULLPTR; // before TEXT: a null pointer converts to std::string_view
     } else if constexpr (std::is_convertible_v<const T&, std::string_view>) {
         return Category::TEXT;
-    } else if constexpr (std::is_same_v<T, std::nullptr_t>) {
-        return Category::NULLPTR;
     } else if constexpr (is_optional<T>::value) {
         return Category::OPTIONAL;
     } else if constexpr (boost::describe::has_describe_enumerators<T>::value) {

@@ -15,9 +15,14 @@ namespace json {
 /// - numbers in the shortest form that reads back to the same value; NaN and the infinities,
 ///   which JSON cannot express as numbers, as the strings "NaN", "Inf" and "-Inf";
 /// - strings between double quotes with `\b` `\t` `\n` `\f` `\r` `\"` `\/` `\\` escaped (the
-///   slash always), other bytes below 0x20 as `\u00XX` through the stream's own number
-///   formatting, and every
-///   other byte unchanged: UTF-8 is not validated, so writing never fails on bad text;
+///   slash always), other bytes below 0x20 as `\u00XX`, and every other byte unchanged: UTF-8
+///   is not validated, so writing never fails on bad text;
+/// - the four digits of a `\u` escape are written with the stream's own number formatting:
+///   the writer sets the base field to hexadecimal, the fill to '0' and the width to 4, and
+///   leaves every other flag as the caller set it. So a caller's `std::uppercase` gives
+///   `\u001F`, `std::left` turns byte 0x01 into `\u1000` and `std::showbase` into `\u00x1`.
+///   The base field is restored afterwards; the fill stays '0'. json::serialize and
+///   json::pretty_print use a stream of their own and always write `\u0001`;
 /// - pretty mode puts every element and member on a line of its own, indented four spaces per
 ///   level, with no space after the colon; every newline is put and flushed as std::endl does;
 /// - an Undefined array element is written as null and an object member whose value is

@@ -1,0 +1,201 @@
+// value_from and value_to: standard types both ways, described structs and enums, the user's
+// hooks, and where each failure is reported.
+#include <json/json.hpp>
+
+#include <boost/describe.hpp>
+#include <gtest/gtest.h>
+
+#include <array>
+#include <cstdint>
+#include <deque>
+#include <list>
+#include <map>
+#include <optional>
+#include <set>
+#include <string>
+#include <tuple>
+#include <unordered_map>
+#include <unordered_set>
+#include <vector>
+
+namespace shop {
+
+enum class Currency { EUR, USD };
+BOOST_DESCRIBE_ENUM(Currency, EUR, USD)
+
+struct Price {
+    double amount;
+    Currency currency;
+};
+BOOST_DESCRIBE_STRUCT(Price, (), (amount, currency))
+
+struct Item {
+    std::string name;
+    Price price;
+    std::optional<int> stock;
+    std::vector<std::string> tags;
+};
+BOOST_DESCRIBE_STRUCT(Item, (), (name, price, stock, tags))
+
+struct Order {
+    std::vector<Item> items;
+    std::map<std::string, std::pair<int, bool>> notes;
+};
+BOOST_DESCRIBE_STRUCT(Order, (), (items, notes))
+
+// A type with hooks of its own: written as "x,y".
+struct Point {
+    int x = 0;
+    int y = 0;
+};
+void to_json(json::Value& out, const Point& point) {
+    out = std::to_string(point.x) + "," + std::to_string(point.y);
+}
+void from_json(const json::Value& in, Point& point) {
+    const std::string& text = in.as_string();
+    point.x = std::stoi(text);
+    point.y = std::stoi(text.substr(text.find(',') + 1));
+}
+bool operator==(const Point& a, const Point& b) {
+    return a.x == b.x && a.y == b.y;
+}
+
+} // namespace shop
+
+namespace {
+
+using json::Value;
+using json::value_from;
+using json::value_to;
+
+template <typename T>
+void expect_round_trip(const T& value, const char* text) {
+    const Value converted = value_from(value);
+    EXPECT_EQ(json::serialize(converted), text);
+    EXPECT_EQ(value_to<T>(converted), value) << text;
+}
+
+TEST(Convert, StandardTypesBothWays) {
+    expect_round_trip(true, "true");
+    expect_round_trip(-7, "-7");
+    expect_round_trip(std::uint64_t{1} << 53, "9007199254740992");
+    expect_round_trip(std::int8_t{-128}, "-128");
+    expect_round_trip(0.1, "0.1");
+    expect_round_trip(0.1f, "0.1");
+    expect_round_trip(std::string("text"), "\"text\"");
+    expect_round_trip(nullptr, "null");
+    expect_round_trip(Value(json::Array{1, "x"}), R"([1,"x"])");
+    expect_round_trip(std::optional<int>(), "null");
+    expect_round_trip(std::optional<int>(3), "3");
+    expect_round_trip(std::vector<int>{1, 2}, "[1,2]");
+    expect_round_trip(std::deque<bool>{true}, "[true]");
+    expect_round_trip(std::list<std::string>{"a", "b"}, R"(["a","b"])");
+    expect_round_trip(std::array<int, 2>{4, 5}, "[4,5]");
+    expect_round_trip(std::set<int>{3, 1}, "[1,3]");
+    expect_round_trip(std::unordered_set<int>{9}, "[9]");
+    expect_round_trip(std::map<std::string, int>{{"b", 2}, {"a", 1}}, R"({"a":1,"b":2})");
+    expect_round_trip(std::unordered_map<std::string, double>{{"k", 0.5}}, R"({"k":0.5})");
+    expect_round_trip(std::pair<int, std::string>(1, "one"), R"([1,"one"])");
+    expect_round_trip(std::tuple<bool, int, std::vector<int>>(false, 2, {3}), "[false,2,[3]]");
+    expect_round_trip(std::vector<std::optional<int>>{1, std::nullopt}, "[1,null]");
+    EXPECT_EQ(value_from("literal"), "literal");
+    EXPECT_EQ(value_from(std::string_view("view")), "view");
+    EXPECT_EQ(value_to<std::optional<int>>(Value()), std::nullopt);
+    EXPECT_EQ(value_from(2.5f).which(), 7); // a float stays single precision
+}
+
+template <typename T>
+std::string failure(const Value& value) {
+    try {
+        value_to<T>(value);
+    } catch (const std::invalid_argument& error) {
+        return std::string("invalid: ") + error.what();
+    } catch (const std::out_of_range& error) {
+        return std::string("missing: ") + error.what();
+    }
+    return "(converted)";
+}
+
+using IntArray3 = std::array<int, 3>;
+using IntPair = std::pair<int, int>;
+using IntMap = std::map<std::string, int>;
+
+TEST(Convert, RangeAndKindFailuresNameTheNumber) {
+    EXPECT_EQ(failure<std::uint8_t>(256), "invalid: expected an integer from 0 to 255, found 256");
+    EXPECT_EQ(failure<unsigned>(-1), "invalid: expected an integer from 0 to 4294967295, found -1");
+    EXPECT_EQ(failure<int>(1.5), "invalid: expected an integer from -2147483648 to 2147483647, "
+                                 "found 1.5");
+    EXPECT_EQ(failure<std::int64_t>(9223372036854775808.0),
+              "invalid: expected an integer from -9223372036854775808 to 9223372036854775807, "
+              "found 9223372036854775808");
+    EXPECT_EQ(value_to<std::int64_t>(Value(-9223372036854775808.0)), INT64_MIN);
+    EXPECT_EQ(failure<float>(1e300), "invalid: expected a number within the range of float, "
+                                     "found 1e+300");
+    EXPECT_EQ(failure<int>("7"), "invalid: expected JSON number, found JSON string");
+    EXPECT_EQ(failure<std::nullptr_t>(0), "invalid: expected JSON null, found JSON number");
+    EXPECT_EQ(failure<IntArray3>(json::Array{1, 2}),
+              "missing: /2: missing element (expected JSON array of 3 elements, found 2)");
+    EXPECT_EQ(failure<IntPair>(json::Array{1, 2, 3}),
+              "invalid: expected JSON array of 2 elements, found 3");
+    EXPECT_EQ(failure<IntMap>(json::Object{{"a/b~", true}}),
+              "invalid: /a~1b~0: expected JSON number, found JSON boolean");
+    EXPECT_EQ(
+        failure<std::vector<std::vector<int>>>(json::Array{json::Array{}, json::Array{1, "x"}}),
+        "invalid: /1/1: expected JSON number, found JSON string");
+}
+
+const char* const ORDER_TEXT =
+    R"({"items":[{"name":"pen","price":{"amount":1.5,"currency":"EUR"},"stock":3,"tags":["a"]},)"
+    R"({"name":"ink","price":{"amount":20,"currency":"USD"},"stock":null,"tags":[]}],)"
+    R"("notes":{"gift":[1,true]}})";
+
+TEST(Convert, DescribedStructsAndEnums) {
+    const shop::Order order{{{"pen", {1.5, shop::Currency::EUR}, 3, {"a"}},
+                             {"ink", {20, shop::Currency::USD}, std::nullopt, {}}},
+                            {{"gift", {1, true}}}};
+    const Value converted = value_from(order);
+    EXPECT_EQ(json::serialize(converted), ORDER_TEXT);
+    const auto back = value_to<shop::Order>(converted);
+    EXPECT_EQ(json::serialize(value_from(back)), ORDER_TEXT);
+
+    // A missing optional member is nullopt; members the struct does not know are ignored.
+    Value lean = converted;
+    lean.at_pointer("/items/0").as_object().erase("stock");
+    lean.at_pointer("/items/0").as_object()["unknown"] = 1;
+    EXPECT_EQ(value_to<shop::Order>(lean).items[0].stock, std::nullopt);
+
+    const struct {
+        const char* pointer;
+        Value replacement;
+        const char* message;
+    } broken[] = {
+        {"/items/1/price/amount", "20",
+         "invalid: /items/1/price/amount: expected JSON number, "
+         "found JSON string"},
+        {"/items/0/price/currency", "GBP",
+         "invalid: /items/0/price/currency: unknown "
+         "enumerator \"GBP\""},
+        {"/items/0/tags", json::Object{},
+         "invalid: /items/0/tags: expected JSON array, found "
+         "JSON object"},
+        {"/notes/gift", json::Array{1},
+         "missing: /notes/gift/1: missing element (expected "
+         "JSON array of 2 elements, found 1)"},
+        {"/items/1/name", Value(), "missing: /items/1/name: missing member"},
+    };
+    for (const auto& row : broken) {
+        Value document = converted;
+        document.at_pointer(row.pointer) = row.replacement;
+        EXPECT_EQ(failure<shop::Order>(document), row.message);
+    }
+    EXPECT_THROW(value_from(static_cast<shop::Currency>(7)), std::invalid_argument);
+}
+
+TEST(Convert, UserHooksComeFirst) {
+    expect_round_trip(std::vector<shop::Point>{{1, 2}, {3, 4}}, R"(["1,2","3,4"])");
+    const Value wrong = json::Array{json::Array{}};
+    EXPECT_EQ(failure<std::vector<shop::Point>>(wrong),
+              "invalid: /0: expected JSON string, found JSON array");
+}
+
+} // namespace
