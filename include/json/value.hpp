@@ -187,40 +187,37 @@ class JSONVALUE_API Value : public detail::ValueVariant {
     /// container assignment.
     void swap(Value& other);
 
-    /// @name Kind queries
-    /// Which kind of JSON value this is. Throw nothing.
-    /// @{
-    bool is_undefined() const noexcept { return which() == detail::UNDEFINED_INDEX; }
-    bool is_null() const noexcept { return which() == detail::NULL_INDEX; }
-    bool is_bool() const noexcept { return which() == detail::BOOL_INDEX; }
-    /// A double or a float.
+    // Kind queries. Constant time; throw nothing.
+
+    bool is_undefined() const noexcept {
+        return which() == detail::UNDEFINED_INDEX;
+    }                                                                       ///< Undefined?
+    bool is_null() const noexcept { return which() == detail::NULL_INDEX; } ///< null?
+    bool is_bool() const noexcept { return which() == detail::BOOL_INDEX; } ///< a bool?
+    /// A double or a float?
     bool is_number() const noexcept {
         return which() == detail::DOUBLE_INDEX || which() == detail::FLOAT_INDEX;
     }
-    bool is_string() const noexcept { return which() == detail::STRING_INDEX; }
-    bool is_array() const noexcept { return which() == detail::ARRAY_INDEX; }
-    bool is_object() const noexcept { return which() == detail::OBJECT_INDEX; }
-    /// @}
+    bool is_string() const noexcept { return which() == detail::STRING_INDEX; } ///< a string?
+    bool is_array() const noexcept { return which() == detail::ARRAY_INDEX; }   ///< an Array?
+    bool is_object() const noexcept { return which() == detail::OBJECT_INDEX; } ///< an Object?
 
-    /// @name Checked access
-    /// The value held, of the kind asked for. Constant time. Throw std::invalid_argument when
-    /// the Value holds another kind, naming both: "expected JSON number, found JSON string".
-    /// @{
-    bool as_bool() const;
-    /// A double, or a float widened to double.
+    // Checked access: the value held, of the kind asked for. Constant time. Each throws
+    // std::invalid_argument when the Value holds another kind, naming both kinds: "expected
+    // JSON number, found JSON string".
+
+    bool as_bool() const; ///< The bool held.
+    /// The number held: a double, or a float widened to double.
     double as_number() const;
-    std::string& as_string();
-    const std::string& as_string() const;
-    Array& as_array();
-    const Array& as_array() const;
-    Object& as_object();
-    const Object& as_object() const;
-    /// @}
+    std::string& as_string();             ///< The string held.
+    const std::string& as_string() const; ///< The string held.
+    Array& as_array();                    ///< The Array held.
+    const Array& as_array() const;        ///< The Array held.
+    Object& as_object();                  ///< The Object held.
+    const Object& as_object() const;      ///< The Object held.
 
-    /// @name Lookups
-    /// None of them inserts anything, and none allocates except to build a std::string key
-    /// from a longer text.
-    /// @{
+    // Lookups. None of them inserts anything, and none allocates except to build a
+    // std::string key longer than the small-string buffer.
 
     /// The member named `key`, or null when this is no Object or has no such member.
     /// Logarithmic in the number of members. Throws nothing.
@@ -258,7 +255,6 @@ class JSONVALUE_API Value : public detail::ValueVariant {
     Value& at_pointer(std::string_view pointer);
     /// @copydoc at_pointer
     const Value& at_pointer(std::string_view pointer) const;
-    /// @}
 
     /// The member named `key` converted with json::value_to<T> (json/convert.hpp), or
     /// `fallback` when there is no such member or it holds Undefined. A member that does not
