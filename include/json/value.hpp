@@ -189,9 +189,8 @@ class JSONVALUE_API Value : public detail::ValueVariant {
 
     // Kind queries. Constant time; throw nothing.
 
-    bool is_undefined() const noexcept {
-        return which() == detail::UNDEFINED_INDEX;
-    }                                                                       ///< Undefined?
+    /// Undefined?
+    bool is_undefined() const noexcept { return which() == detail::UNDEFINED_INDEX; }
     bool is_null() const noexcept { return which() == detail::NULL_INDEX; } ///< null?
     bool is_bool() const noexcept { return which() == detail::BOOL_INDEX; } ///< a bool?
     /// A double or a float?
