@@ -262,17 +262,17 @@ void move_content(Value& from, Value& to) {
 
 // Undoes a step of a failed swap. If even that cannot allocate, `to` holds false and the
 // content is released with `from`: a Value never ends up holding the other's content.
-void put_back(Value& from, Value& to) noexcept {
+void put_back(Value& from, Value& to) noexcept { // NOLINT(bugprone-exception-escape)
     try {
         move_content(from, to);
     } catch (...) {
-        to = Value(false);
+        to = Value(false); // a scalar assignment: cannot fail
     }
 }
 
 } // namespace
 
-void Value::swap(Value& other) {
+void Value::swap(Value& other) { // NOLINT(bugprone-exception-escape): may throw, see value.hpp
     detail::ValueVariant& mine = *this;
     if (which() == other.which() || (!is_container(*this) && !is_container(other))) {
         // Same alternative: the contents (wrapper pointers, string buffers) are exchanged.

@@ -164,7 +164,7 @@ const Object& Value::as_object() const {
     return const_cast<Value*>(this)->as_object();
 }
 
-Value* Value::find(const std::string& key) noexcept {
+Value* Value::find(const std::string& key) {
     if (which() != detail::OBJECT_INDEX) {
         return nullptr;
     }
@@ -173,7 +173,7 @@ Value* Value::find(const std::string& key) noexcept {
     return found == members.end() ? nullptr : &found->second;
 }
 
-const Value* Value::find(const std::string& key) const noexcept {
+const Value* Value::find(const std::string& key) const {
     return const_cast<Value*>(this)->find(key);
 }
 

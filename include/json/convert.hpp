@@ -425,8 +425,10 @@ T to_sequence(const Value& in) {
 template <typename T>
 T to_map(const Value& in) {
     T result;
-    for (const auto& [key, item] : in.as_object()) {
-        result.emplace(key, below(key, [&] { return value_to<typename T::mapped_type>(item); }));
+    for (const auto& member : in.as_object()) {
+        result.emplace(member.first, below(member.first, [&] {
+                           return value_to<typename T::mapped_type>(member.second);
+                       }));
     }
     return result;
 }

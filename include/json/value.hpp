@@ -185,7 +185,7 @@ class JSONVALUE_API Value : public detail::ValueVariant {
     /// memory stays exhausted, so that a Value's own container cannot be put back either, does
     /// that Value end up holding `false` with its content released, as after a failed
     /// container assignment.
-    void swap(Value& other);
+    void swap(Value& other); // NOLINT(bugprone-exception-escape): may throw, as said above
 
     // Kind queries. Constant time; throw nothing.
 
@@ -220,12 +220,12 @@ class JSONVALUE_API Value : public detail::ValueVariant {
 
     /// The member named `key`, or null when this is no Object or has no such member.
     /// Logarithmic in the number of members. Throws nothing.
-    Value* find(const std::string& key) noexcept;
+    Value* find(const std::string& key);
     /// The member named `key`, or null when this is no Object or has no such member.
     /// Logarithmic in the number of members. Throws nothing.
-    const Value* find(const std::string& key) const noexcept;
+    const Value* find(const std::string& key) const;
     /// Whether this is an Object with a member named `key`. Throws nothing.
-    bool contains(const std::string& key) const noexcept { return find(key) != nullptr; }
+    bool contains(const std::string& key) const { return find(key) != nullptr; }
 
     /// The member named `key`. Logarithmic. Throws std::out_of_range naming the key when there
     /// is no such member, std::invalid_argument when this is no Object.
@@ -266,7 +266,7 @@ class JSONVALUE_API Value : public detail::ValueVariant {
 /// Exchanges two Values as Value::swap does; found by argument-dependent lookup, so that
 /// `using std::swap; swap(a, b);` and the standard algorithms that swap (std::reverse,
 /// std::iter_swap) never copy a tree.
-inline void swap(Value& left, Value& right) {
+inline void swap(Value& left, Value& right) { // NOLINT(bugprone-exception-escape)
     left.swap(right);
 }
 
