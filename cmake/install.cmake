@@ -1,5 +1,5 @@
-# Installs headers, libraries, the CMake package jsonvalue (target jsonvalue::jsonvalue) and
-# the pkg-config file jsonvalue.pc.
+# Installs headers, libraries, the CMake package jsonvalue (target jsonvalue::jsonvalue), the
+# pkg-config file jsonvalue.pc and the licence.
 include(CMakePackageConfigHelpers)
 
 set(JSONVALUE_CMAKE_DIR ${CMAKE_INSTALL_LIBDIR}/cmake/jsonvalue)
@@ -22,6 +22,12 @@ install(FILES
   ${CMAKE_CURRENT_BINARY_DIR}/jsonvalueConfigVersion.cmake
   DESTINATION ${JSONVALUE_CMAKE_DIR})
 
+# The way up from the .pc file to the prefix: lib/pkgconfig or lib/x86_64-linux-gnu/pkgconfig.
+file(RELATIVE_PATH JSONVALUE_PC_TO_PREFIX /${CMAKE_INSTALL_LIBDIR}/pkgconfig /)
+string(REGEX REPLACE "/$" "" JSONVALUE_PC_TO_PREFIX "${JSONVALUE_PC_TO_PREFIX}")
 configure_file(cmake/jsonvalue.pc.in ${CMAKE_CURRENT_BINARY_DIR}/jsonvalue.pc @ONLY)
 install(FILES ${CMAKE_CURRENT_BINARY_DIR}/jsonvalue.pc
   DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
+
+# Under Debian's name for it, share/doc/jsonvalue/copyright, which the Debian package needs.
+install(FILES LICENSE DESTINATION ${CMAKE_INSTALL_DOCDIR} RENAME copyright)

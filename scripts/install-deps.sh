@@ -1,10 +1,18 @@
 #!/usr/bin/env bash
-# Installs the Debian packages the build and tests need, and the de_DE.UTF-8 locale that the
-# locale tests use. Does nothing when everything is already there.
+# Installs the Debian packages that scripts/format-sample.sh and scripts/test.sh need, on top
+# of a minimal Debian 12 (what debootstrap --variant=minbase installs), and the de_DE.UTF-8
+# locale that the locale tests use. Further packages may be named as arguments. Does nothing
+# when everything is already there. Run as root.
 set -euo pipefail
 
-packages=(g++ cmake make pkg-config libboost1.81-dev libgtest-dev clang-format clang-tidy clang-14 libclang-rt-14-dev
-    valgrind dpkg-dev doxygen locales "$@")
+packages=(
+    g++ binutils cmake make libboost1.81-dev # the library, jsonfmt; nm and c++filt for tests
+    libgtest-dev locales                     # the unit tests; locale-gen for de_DE.UTF-8
+    git clang-format clang-tidy              # formatting check over `git ls-files`, clang-tidy
+    doxygen valgrind                         # API reference; memcheck of the unit tests
+    clang-14 libclang-rt-14-dev              # the fuzzers (libFuzzer, sanitizer runtimes)
+    file dpkg-dev pkg-config                 # cpack -G DEB (file, dpkg-shlibdeps); the consumers
+    "$@")
 
 missing=()
 for package in "${packages[@]}"; do

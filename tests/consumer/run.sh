@@ -1,7 +1,7 @@
 #!/usr/bin/env bash
 # Installs the build tree into a fresh prefix, then builds the consumer program against it
-# twice, with CMake's find_package and with pkg-config and plain g++, and runs both without
-# LD_LIBRARY_PATH: the installed libraries find each other through their RUNPATH.
+# twice, as C++20, with CMake's find_package and with pkg-config and plain g++, and runs both
+# without LD_LIBRARY_PATH: the installed libraries find each other through their RUNPATH.
 set -euo pipefail
 build_dir=$1
 consumer_dir=$2
@@ -17,7 +17,8 @@ env -u LD_LIBRARY_PATH "$work/cmake-build/consumer"
 
 export PKG_CONFIG_PATH="$libdir/pkgconfig"
 # shellcheck disable=SC2046 # the flags are meant to split
-g++ -o "$work/pkg-config-consumer" "$consumer_dir/main.cpp" $(pkg-config --cflags --libs jsonvalue)
+g++ -std=c++20 -o "$work/pkg-config-consumer" "$consumer_dir/main.cpp" \
+    $(pkg-config --cflags --libs jsonvalue)
 env -u LD_LIBRARY_PATH "$work/pkg-config-consumer"
 
 "$work/prefix/bin/jsonfmt" --version

@@ -1,7 +1,7 @@
 #!/usr/bin/env bash
 # Builds the Debian package from a Release build tree, installs it with apt-get (which
-# resolves its dependencies), builds and runs the consumer against the system installation
-# with find_package and with pkg-config, then removes the package again.
+# resolves its dependencies), builds and runs the consumer as C++20 against the system
+# installation with find_package and with pkg-config, then removes the package again.
 # Usage: check_deb.sh BUILD_DIR CONSUMER_DIR
 set -euo pipefail
 build_dir=$(cd "$1" && pwd)
@@ -19,6 +19,7 @@ cmake -S "$consumer_dir" -B "$work/cmake-build" >/dev/null
 cmake --build "$work/cmake-build" >/dev/null
 "$work/cmake-build/consumer"
 # shellcheck disable=SC2046 # the flags are meant to split
-g++ -o "$work/pkg-config-consumer" "$consumer_dir/main.cpp" $(pkg-config --cflags --libs jsonvalue)
+g++ -std=c++20 -o "$work/pkg-config-consumer" "$consumer_dir/main.cpp" \
+    $(pkg-config --cflags --libs jsonvalue)
 "$work/pkg-config-consumer"
 jsonfmt --version
