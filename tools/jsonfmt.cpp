@@ -1,41 +1,48 @@
-// jsonfmt: validates JSON documents and writes them pretty (4-space) or compact.
+// jsonfmt: validates JSON documents (whole files or JSON Lines) and writes them pretty
+// (4-space) or compact, whole or the value at a JSON Pointer, to standard output, a file, or
+// back into each file.
+#include "file_output.hpp"
+
 #include <json/json.hpp>
+
+#include <CLI/CLI.hpp>
 
 #include <algorithm>
 #include <cerrno>
-#include <charconv>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
+#include <fcntl.h>
+#include <memory>
+#include <new>
+#include <ostream>
 #include <string>
 #include <string_view>
+#include <system_error>
+#include <unistd.h>
 #include <vector>
 
 namespace {
 
 constexpr const char* VERSION = "0.1.0";
 
-constexpr const char* USAGE = R"(Usage: jsonfmt [OPTIONS] [FILE...]
-Reads each FILE (standard input when there is none, or for "-"), checks that it holds exactly
-one JSON document and writes it to standard output, pretty (4-space indentation) by default.
-
-Options:
-  -c, --compact      write compact text, without whitespace
-      --check        only check the documents; write nothing
-      --max-depth N  refuse documents nested deeper than N (default 512)
-  -h, --help         show this help and exit
-      --version      show the version and exit
-
-Exit status: 0 when every document is valid, 1 when one is invalid, 2 for usage or I/O errors.
-)";
-
 enum ExitStatus { VALID = 0, INVALID = 1, TROUBLE = 2 };
 
 struct Settings {
     bool compact = false;
     bool check_only = false;
+    bool lines = false;
+    bool in_place = false;
+    std::string pointer;
+    bool has_pointer = false;
+    std::string output_path;
     json::ParseOptions parse_options;
     std::vector<std::string> files;
 };
+
+void complain(const std::string& message) {
+    std::fprintf(stderr, "jsonfmt: %s\n", message.c_str());
+}
 
 // Reads all of `file` into `text`; false (with errno set) when it cannot.
 bool read_all(std::FILE* file, std::string& text) {
@@ -47,23 +54,24 @@ bool read_all(std::FILE* file, std::string& text) {
     return std::ferror(file) == 0;
 }
 
-bool read_input(const std::string& name, std::string& text) {
-    if (name == "-") {
-        return read_all(stdin, text);
+// An open input file (standard input for "-"), closed when it goes.
+struct Input {
+    explicit Input(const std::string& name)
+        : file(name == "-" ? stdin : std::fopen(name.c_str(), "rb")), owned(name != "-") {}
+    ~Input() {
+        if (owned && file != nullptr) {
+            std::fclose(file);
+        }
     }
-    std::FILE* file = std::fopen(name.c_str(), "rb");
-    if (file == nullptr) {
-        return false;
-    }
-    const bool ok = read_all(file, text);
-    const int saved = errno;
-    std::fclose(file);
-    errno = saved;
-    return ok;
-}
+    Input(const Input&) = delete;
+    Input& operator=(const Input&) = delete;
+    std::FILE* file;
+    bool owned;
+};
 
 // The line holding the failure, cut to a window around it on long (minified) lines, and a
-// caret under the failing byte; tabs before the caret are kept so that it lines up.
+// caret under the failing byte; tabs before the caret are kept so that it lines up. The line
+// is written byte for byte, NUL bytes included.
 void show_failure_line(std::string_view text, const json::ParseReport& report) {
     constexpr std::size_t before = 60;
     constexpr std::size_t after = 20;
@@ -73,109 +81,300 @@ void show_failure_line(std::string_view text, const json::ParseReport& report) {
         line_end = text.size();
     }
     std::size_t from = line_start;
-    std::string lead;
+    std::string shown;
     if (report.offset - line_start > before) {
         from = report.offset - before;
-        lead = "...";
+        shown = "...";
     }
     const std::size_t to = std::min(line_end, report.offset + after);
-    const std::string_view shown = text.substr(from, to - from);
-    std::string caret = std::string(lead.size(), ' ');
+    std::string caret(shown.size(), ' ');
     for (std::size_t i = from; i < report.offset; ++i) {
         caret += text[i] == '\t' ? '\t' : ' ';
     }
-    std::fprintf(stderr, "%s%.*s%s\n%s^\n", lead.c_str(), static_cast<int>(shown.size()),
-                 shown.data(), to < line_end ? "..." : "", caret.c_str());
+    shown.append(text.substr(from, to - from)).append(to < line_end ? "...\n" : "\n");
+    shown.append(caret).append("^\n");
+    std::fwrite(shown.data(), 1, shown.size(), stderr);
 }
 
-ExitStatus format_one(const std::string& name, const Settings& settings) {
-    const std::string shown_name = name == "-" ? "<stdin>" : name;
+// Writes parsed documents, or the values at the pointer, onto one output.
+class Writer {
+  public:
+    Writer(const Settings& settings, int descriptor)
+        : settings(settings), buffer(descriptor), stream(&buffer) {
+        serializer.pretty_print(!settings.compact && !settings.lines);
+    }
+
+    // Writes `document` (or its value at the pointer) and a newline. INVALID when the pointer
+    // finds nothing, TROUBLE when writing fails.
+    ExitStatus write(const json::Value& document, const std::string& where) {
+        const json::Value* value = &document;
+        if (settings.has_pointer) {
+            try {
+                value = &document.at_pointer(settings.pointer);
+            } catch (const std::out_of_range& error) {
+                std::fprintf(stderr, "%s: no value at %s: %s\n", where.c_str(),
+                             settings.pointer.c_str(), error.what());
+                return INVALID;
+            }
+        }
+        if (!settings.check_only) {
+            serializer.write(stream, *value);
+            stream.put('\n');
+        }
+        return VALID;
+    }
+
+    // Hands everything written on; false (after saying why) when writing failed.
+    bool finish(const std::string& destination) {
+        if (!buffer.finish() || !stream) {
+            complain("writing " + destination + ": " + std::strerror(buffer.error()));
+            return false;
+        }
+        return true;
+    }
+
+  private:
+    const Settings& settings;
+    jsonfmt::DescriptorBuffer buffer;
+    std::ostream stream;
+    json::Serializer serializer;
+};
+
+ExitStatus report_parse_failure(const std::string& where, std::string_view text,
+                                const json::ParseReport& report, std::size_t line) {
+    std::fprintf(stderr, "%s:%zu:%zu: error: %s\n", where.c_str(), line + report.line - 1,
+                 report.column, report.message().c_str());
+    show_failure_line(text, report);
+    return INVALID;
+}
+
+// One document per file.
+ExitStatus format_document(const std::string& name, const std::string& shown_name,
+                           const Settings& settings, Writer& writer) {
     std::string text;
-    if (!read_input(name, text)) {
-        std::fprintf(stderr, "jsonfmt: %s: %s\n", shown_name.c_str(), std::strerror(errno));
-        return TROUBLE;
+    {
+        const Input input(name);
+        if (input.file == nullptr || !read_all(input.file, text)) {
+            complain(shown_name + ": " + std::strerror(errno));
+            return TROUBLE;
+        }
     }
     json::Value document;
     const json::ParseReport report = json::parse(text, document, settings.parse_options);
     if (!report) {
-        std::fprintf(stderr, "%s:%zu:%zu: error: %s\n", shown_name.c_str(), report.line,
-                     report.column, report.message().c_str());
-        show_failure_line(text, report);
-        return INVALID;
+        return report_parse_failure(shown_name, text, report, 1);
     }
-    if (!settings.check_only) {
-        // The whole text at once: one write, never a flush per line.
-        std::string output =
-            settings.compact ? json::serialize(document) : json::pretty_print(document);
-        output += '\n';
-        if (std::fwrite(output.data(), 1, output.size(), stdout) != output.size()) {
-            std::fprintf(stderr, "jsonfmt: writing the output: %s\n", std::strerror(errno));
-            return TROUBLE;
-        }
-    }
-    return VALID;
+    return writer.write(document, shown_name);
 }
 
-bool parse_depth(const char* text, std::size_t& depth) {
-    const char* end = text + std::strlen(text);
-    const auto [stop, error] = std::from_chars(text, end, depth);
-    return error == std::errc() && stop == end && depth > 0;
+// JSON Lines: every line that is not blank is a document; memory follows the longest line.
+ExitStatus format_lines(const std::string& name, const std::string& shown_name,
+                        const Settings& settings, Writer& writer) {
+    const Input input(name);
+    if (input.file == nullptr) {
+        complain(shown_name + ": " + std::strerror(errno));
+        return TROUBLE;
+    }
+    std::unique_ptr<char, decltype(&std::free)> line(nullptr, &std::free);
+    std::size_t capacity = 0;
+    ExitStatus status = VALID;
+    char* raw = nullptr;
+    ssize_t length = 0;
+    for (std::size_t number = 1; (length = ::getline(&raw, &capacity, input.file)) >= 0; ++number) {
+        line.release();
+        line.reset(raw);
+        std::string_view text(raw, static_cast<std::size_t>(length));
+        if (!text.empty() && text.back() == '\n') {
+            text.remove_suffix(1);
+        }
+        if (text.find_first_not_of(" \t\r") == std::string_view::npos) {
+            continue;
+        }
+        json::Value document;
+        const json::ParseReport report = json::parse(text, document, settings.parse_options);
+        const std::string where = shown_name + ":" + std::to_string(number);
+        status = std::max(status, report ? writer.write(document, where)
+                                         : report_parse_failure(shown_name, text, report, number));
+    }
+    line.release();
+    line.reset(raw);
+    if (std::ferror(input.file) != 0) {
+        complain(shown_name + ": " + std::strerror(errno));
+        return TROUBLE;
+    }
+    return status;
+}
+
+ExitStatus format_file(const std::string& name, const Settings& settings, Writer& writer) {
+    const std::string shown_name = name == "-" ? "<stdin>" : name;
+    try {
+        return settings.lines ? format_lines(name, shown_name, settings, writer)
+                              : format_document(name, shown_name, settings, writer);
+    } catch (const std::bad_alloc&) {
+        complain(shown_name + ": out of memory");
+        return TROUBLE;
+    }
+}
+
+// Rewrites `name` with its formatted text; the original stays as it was unless every step
+// succeeds.
+ExitStatus rewrite_in_place(const std::string& name, const Settings& settings) {
+    try {
+        jsonfmt::Replacement replacement(name);
+        ExitStatus status = VALID;
+        {
+            Writer writer(settings, replacement.descriptor());
+            status = format_file(name, settings, writer);
+            if (status == VALID && !writer.finish(name)) {
+                status = TROUBLE;
+            }
+        }
+        if (status == VALID) {
+            replacement.commit();
+        }
+        return status;
+    } catch (const std::system_error& error) {
+        complain(error.what());
+        return TROUBLE;
+    } catch (const std::bad_alloc&) {
+        complain(name + ": out of memory");
+        return TROUBLE;
+    }
+}
+
+// Writes what a --help or --version call printed; a failed write is trouble like any other.
+int finish_standard_output(int status) {
+    std::fflush(stdout);
+    if (std::ferror(stdout) != 0) {
+        complain(std::string("writing standard output: ") + std::strerror(errno));
+        return TROUBLE;
+    }
+    return status;
 }
 
 // Fills `settings` from the command line; returns an exit status when the program is done.
-bool read_arguments(int argc, char** argv, Settings& settings, ExitStatus& status) {
-    bool options_end = false;
-    for (int i = 1; i < argc; ++i) {
-        const std::string_view argument = argv[i];
-        if (options_end || argument == "-" || argument.empty() || argument[0] != '-') {
-            settings.files.emplace_back(argument);
-        } else if (argument == "--") {
-            options_end = true;
-        } else if (argument == "-c" || argument == "--compact") {
-            settings.compact = true;
-        } else if (argument == "--check") {
-            settings.check_only = true;
-        } else if (argument == "--max-depth") {
-            if (i + 1 == argc || !parse_depth(argv[i + 1], settings.parse_options.max_depth)) {
-                std::fprintf(stderr, "jsonfmt: --max-depth needs a positive number\n");
-                status = TROUBLE;
-                return true;
-            }
-            ++i;
-        } else if (argument == "-h" || argument == "--help") {
-            std::fputs(USAGE, stdout);
-            status = VALID;
-            return true;
-        } else if (argument == "--version") {
-            std::printf("jsonfmt %s\n", VERSION);
-            status = VALID;
-            return true;
-        } else {
-            std::fprintf(stderr, "jsonfmt: unknown option '%s' (try --help)\n", argv[i]);
-            status = TROUBLE;
-            return true;
+bool read_arguments(int argc, char** argv, Settings& settings, int& status) {
+    CLI::App app("Checks JSON documents and writes them pretty (4-space indentation, keys "
+                 "sorted) or compact.\nReads each FILE, or standard input when there is none "
+                 "or for \"-\".",
+                 "jsonfmt");
+    app.set_help_flag("-h,--help", "show this help and exit");
+    app.add_flag("-c,--compact", settings.compact, "write compact text, without whitespace");
+    app.add_flag("--check", settings.check_only, "only check the documents; write nothing");
+    app.add_flag("-l,--lines", settings.lines, "JSON Lines: one document per non-blank line");
+    app.add_option("-p,--pointer", settings.pointer, "write only the value at this JSON Pointer")
+        ->type_name("PTR");
+    app.add_option("-o,--output", settings.output_path, "write to FILE, not standard output")
+        ->type_name("FILE");
+    app.add_flag("-i,--in-place", settings.in_place, "rewrite each FILE with its formatted text");
+    app.add_option("--max-depth", settings.parse_options.max_depth,
+                   "refuse nesting deeper than N (default 512)")
+        ->type_name("N")
+        ->check(CLI::Validator(
+            [](const std::string& text) {
+                return text.find_first_not_of("0123456789") == std::string::npos &&
+                               text.find_first_not_of('0') != std::string::npos
+                           ? std::string()
+                           : std::string("needs a positive number");
+            },
+            ""));
+    app.set_version_flag("--version", std::string("jsonfmt ") + VERSION,
+                         "show the version and exit");
+    app.add_option("FILE", settings.files, "the documents to read")->type_name("");
+    app.footer("Exit status: 0 when every document is valid, 1 when one is invalid or a pointer\n"
+               "finds nothing, 2 for usage errors, I/O errors and running out of memory.");
+    try {
+        app.parse(argc, argv);
+    } catch (const CLI::CallForHelp&) {
+        std::printf("%s\n", app.help().c_str());
+        status = finish_standard_output(VALID);
+        return true;
+    } catch (const CLI::CallForVersion& version) {
+        std::printf("%s\n", version.what());
+        status = finish_standard_output(VALID);
+        return true;
+    } catch (const CLI::ParseError& error) {
+        complain(std::string(error.what()) + " (try --help)");
+        status = TROUBLE;
+        return true;
+    }
+    settings.has_pointer = app.count("--pointer") != 0;
+    std::string usage_error;
+    if (settings.has_pointer) {
+        try {
+            json::Value().find_pointer(settings.pointer);
+        } catch (const std::invalid_argument& error) {
+            usage_error = std::string("--pointer: ") + error.what();
         }
     }
     if (settings.files.empty()) {
         settings.files.emplace_back("-");
     }
+    if (settings.in_place &&
+        std::find(settings.files.begin(), settings.files.end(), "-") != settings.files.end()) {
+        usage_error = "--in-place needs files: it cannot rewrite standard input";
+    }
+    if (settings.in_place && !settings.output_path.empty()) {
+        usage_error = "--in-place writes back into each FILE: it does not go with --output";
+    }
+    if (settings.in_place && (settings.check_only || settings.has_pointer)) {
+        usage_error = "--in-place rewrites whole files: it goes with neither --check nor --pointer";
+    }
+    if (!usage_error.empty()) {
+        complain(usage_error + " (try --help)");
+        status = TROUBLE;
+        return true;
+    }
     return false;
+}
+
+int run(const Settings& settings) {
+    int status = VALID;
+    if (settings.in_place) {
+        for (const std::string& name : settings.files) {
+            status = std::max<int>(status, rewrite_in_place(name, settings));
+        }
+        return status;
+    }
+    int descriptor = STDOUT_FILENO;
+    std::string destination = "standard output";
+    if (!settings.output_path.empty()) {
+        descriptor =
+            ::open(settings.output_path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
+        if (descriptor < 0) {
+            complain(settings.output_path + ": " + std::strerror(errno));
+            return TROUBLE;
+        }
+        destination = settings.output_path;
+    }
+    Writer writer(settings, descriptor);
+    for (const std::string& name : settings.files) {
+        status = std::max<int>(status, format_file(name, settings, writer));
+        // Each file's text goes out before the next file's messages.
+        if (!writer.finish(destination)) {
+            status = TROUBLE;
+            break;
+        }
+    }
+    if (descriptor != STDOUT_FILENO && ::close(descriptor) != 0) {
+        complain("writing " + destination + ": " + std::strerror(errno));
+        status = TROUBLE;
+    }
+    return status;
 }
 
 } // namespace
 
 int main(int argc, char** argv) {
-    Settings settings;
-    ExitStatus status = VALID;
-    if (read_arguments(argc, argv, settings, status)) {
-        return status;
+    try {
+        Settings settings;
+        int status = VALID;
+        if (read_arguments(argc, argv, settings, status)) {
+            return status;
+        }
+        return run(settings);
+    } catch (const std::bad_alloc&) {
+        complain("out of memory");
+        return TROUBLE;
     }
-    for (const std::string& name : settings.files) {
-        status = std::max(status, format_one(name, settings));
-    }
-    if (std::fflush(stdout) != 0) {
-        std::fprintf(stderr, "jsonfmt: writing the output: %s\n", std::strerror(errno));
-        status = TROUBLE;
-    }
-    return status;
 }
