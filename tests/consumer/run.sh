@@ -1,7 +1,8 @@
 #!/usr/bin/env bash
 # Installs the build tree into a fresh prefix, then builds the consumer program against it
 # twice, as C++20, with CMake's find_package and with pkg-config and plain g++, and runs both
-# without LD_LIBRARY_PATH: the installed libraries find each other through their RUNPATH.
+# without LD_LIBRARY_PATH: the installed libraries find each other through their RUNPATH. The
+# reading example is built the same way and its output compared with what it must print.
 set -euo pipefail
 build_dir=$1
 consumer_dir=$2
@@ -14,6 +15,9 @@ libdir=$(find "$work/prefix" -name 'jsonvalue.pc' -printf '%h')/..
 cmake -S "$consumer_dir" -B "$work/cmake-build" -DCMAKE_PREFIX_PATH="$work/prefix" >/dev/null
 cmake --build "$work/cmake-build" >/dev/null
 env -u LD_LIBRARY_PATH "$work/cmake-build/consumer"
+# The reading example reads its configuration and prints what it found and each error.
+env -u LD_LIBRARY_PATH "$work/cmake-build/read_config" "$consumer_dir/../../examples/config.json" |
+    diff - "$consumer_dir/read_config.expected"
 
 export PKG_CONFIG_PATH="$libdir/pkgconfig"
 # shellcheck disable=SC2046 # the flags are meant to split
