@@ -2,6 +2,7 @@
 
 #include <cerrno>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -55,7 +56,14 @@ bool DescriptorBuffer::finish() {
     return written;
 }
 
-Replacement::Replacement(const std::string& path) : path(path) {
+Replacement::Replacement(const std::string& name) {
+    // A symbolic link stays a link: the file it leads to is the one replaced.
+    char* resolved = ::realpath(name.c_str(), nullptr);
+    if (resolved == nullptr) {
+        throw_errno(name);
+    }
+    path = resolved;
+    std::free(resolved); // NOLINT(cppcoreguidelines-no-malloc): realpath's own allocation
     struct stat original {};
     if (::stat(path.c_str(), &original) != 0) {
         throw_errno(path);
@@ -64,8 +72,8 @@ Replacement::Replacement(const std::string& path) : path(path) {
     // Beside the original, so that the rename stays within one file system.
     const std::size_t slash = path.rfind('/');
     const std::string directory = slash == std::string::npos ? "" : path.substr(0, slash + 1);
-    const std::string name = slash == std::string::npos ? path : path.substr(slash + 1);
-    temporary_path = directory + "." + name + ".jsonfmt-XXXXXX";
+    const std::string base = slash == std::string::npos ? path : path.substr(slash + 1);
+    temporary_path = directory + "." + base + ".jsonfmt-XXXXXX";
     std::vector<char> pattern(temporary_path.begin(), temporary_path.end());
     pattern.push_back('\0');
     temporary = ::mkstemp(pattern.data());

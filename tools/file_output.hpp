@@ -38,13 +38,14 @@ class DescriptorBuffer : public std::streambuf {
     std::array<char, std::size_t{64} * 1024> buffer{};
 };
 
-/// A temporary file in the directory of `path`, renamed over `path` by commit() once it has
-/// been written and flushed to disk, with the original's permission bits. Until then the
+/// A temporary file in the directory of the file `name` (the file a symbolic link leads to),
+/// renamed over that file by commit() once it has been written and flushed to disk, with the
+/// original's permission bits. Until then the
 /// original is untouched; a Replacement that is not committed removes its file. Failures
 /// throw std::system_error naming the step.
 class Replacement {
   public:
-    explicit Replacement(const std::string& path);
+    explicit Replacement(const std::string& name);
     ~Replacement();
     Replacement(const Replacement&) = delete;
     Replacement& operator=(const Replacement&) = delete;

@@ -18,6 +18,7 @@
 #include <ostream>
 #include <string>
 #include <string_view>
+#include <sys/stat.h>
 #include <system_error>
 #include <unistd.h>
 #include <vector>
@@ -252,6 +253,21 @@ int finish_standard_output(int status) {
     return status;
 }
 
+// Whether `path` names an existing file that is also one of `files` (by device and inode, so
+// that another spelling or a link is caught too).
+bool is_one_of(const std::string& path, const std::vector<std::string>& files) {
+    struct stat output {};
+    if (::stat(path.c_str(), &output) != 0) {
+        return false;
+    }
+    return std::any_of(files.begin(), files.end(), [&output](const std::string& name) {
+        struct stat input {};
+        const bool found =
+            name == "-" ? ::fstat(STDIN_FILENO, &input) == 0 : ::stat(name.c_str(), &input) == 0;
+        return found && input.st_dev == output.st_dev && input.st_ino == output.st_ino;
+    });
+}
+
 // Fills `settings` from the command line; returns an exit status when the program is done.
 bool read_arguments(int argc, char** argv, Settings& settings, int& status) {
     CLI::App app("Checks JSON documents and writes them pretty (4-space indentation, keys "
@@ -320,6 +336,10 @@ bool read_arguments(int argc, char** argv, Settings& settings, int& status) {
     if (settings.in_place && (settings.check_only || settings.has_pointer)) {
         usage_error = "--in-place rewrites whole files: it goes with neither --check nor --pointer";
     }
+    if (!settings.output_path.empty() && is_one_of(settings.output_path, settings.files)) {
+        usage_error = "--output " + settings.output_path +
+                      " is also an input: writing it would destroy it (use --in-place)";
+    }
     if (!usage_error.empty()) {
         complain(usage_error + " (try --help)");
         status = TROUBLE;
@@ -338,7 +358,7 @@ int run(const Settings& settings) {
     }
     int descriptor = STDOUT_FILENO;
     std::string destination = "standard output";
-    if (!settings.output_path.empty()) {
+    if (!settings.output_path.empty() && !settings.check_only) {
         descriptor =
             ::open(settings.output_path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
         if (descriptor < 0) {
