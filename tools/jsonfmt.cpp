@@ -13,7 +13,6 @@
 #include <cstdlib>
 #include <cstring>
 #include <fcntl.h>
-#include <memory>
 #include <new>
 #include <ostream>
 #include <string>
@@ -168,6 +167,16 @@ ExitStatus format_document(const std::string& name, const std::string& shown_nam
     return writer.write(document, shown_name);
 }
 
+// The buffer getline(3) reads each line into, grown to the longest line and freed at the end.
+struct LineBuffer {
+    LineBuffer() = default;
+    ~LineBuffer() { std::free(data); } // NOLINT(cppcoreguidelines-no-malloc): getline's memory
+    LineBuffer(const LineBuffer&) = delete;
+    LineBuffer& operator=(const LineBuffer&) = delete;
+    char* data = nullptr;
+    std::size_t capacity = 0;
+};
+
 // JSON Lines: every line that is not blank is a document; memory follows the longest line.
 ExitStatus format_lines(const std::string& name, const std::string& shown_name,
                         const Settings& settings, Writer& writer) {
@@ -176,15 +185,12 @@ ExitStatus format_lines(const std::string& name, const std::string& shown_name,
         complain(shown_name + ": " + std::strerror(errno));
         return TROUBLE;
     }
-    std::unique_ptr<char, decltype(&std::free)> line(nullptr, &std::free);
-    std::size_t capacity = 0;
+    LineBuffer line;
     ExitStatus status = VALID;
-    char* raw = nullptr;
     ssize_t length = 0;
-    for (std::size_t number = 1; (length = ::getline(&raw, &capacity, input.file)) >= 0; ++number) {
-        line.release();
-        line.reset(raw);
-        std::string_view text(raw, static_cast<std::size_t>(length));
+    for (std::size_t number = 1; (length = ::getline(&line.data, &line.capacity, input.file)) >= 0;
+         ++number) {
+        std::string_view text(line.data, static_cast<std::size_t>(length));
         if (!text.empty() && text.back() == '\n') {
             text.remove_suffix(1);
         }
@@ -197,8 +203,6 @@ ExitStatus format_lines(const std::string& name, const std::string& shown_name,
         status = std::max(status, report ? writer.write(document, where)
                                          : report_parse_failure(shown_name, text, report, number));
     }
-    line.release();
-    line.reset(raw);
     if (std::ferror(input.file) != 0) {
         complain(shown_name + ": " + std::strerror(errno));
         return TROUBLE;
@@ -395,6 +399,9 @@ int main(int argc, char** argv) {
         return run(settings);
     } catch (const std::bad_alloc&) {
         complain("out of memory");
+        return TROUBLE;
+    } catch (const std::exception& error) {
+        complain(error.what());
         return TROUBLE;
     }
 }
