@@ -1,12 +1,16 @@
 #!/usr/bin/env python3
-"""Prints the benchmark table: for each document and operation, jsonvalue's throughput and
-the ratio of its throughput to each peer's (above 1.0: jsonvalue is faster), from the medians
-of one run of json_bench (Google Benchmark's JSON output). For memory, the ratio is the
-peer's heap divided by jsonvalue's (above 1.0: jsonvalue holds less)."""
+"""Prints two tables from the medians of one run of json_bench (Google Benchmark's JSON
+output). The first gives, for each document and operation, jsonvalue's throughput and the
+ratio of its throughput to each peer's (above 1.0: jsonvalue is faster). The second gives, for
+each operation and peer, the geometric mean of that ratio over the documents and the worst
+document's ratio. For memory, the ratio is the peer's heap divided by jsonvalue's (above 1.0:
+jsonvalue holds less). A peer without the operation shows "-"."""
 import json
+import math
 import sys
 
-PEERS = [("rapidjson", "RapidJSON"), ("boostjson", "Boost.JSON"), ("nlohmann", "nlohmann")]
+PEERS = [("nlohmann", "nlohmann"), ("jsoncpp", "jsoncpp"), ("rapidjson", "RapidJSON"),
+         ("boostjson", "Boost.JSON"), ("simdjson", "simdjson")]
 OPERATIONS = ["compact", "pretty", "parse", "copy", "destroy", "memory"]
 DOCUMENTS = ["twitter", "citm_catalog", "canada"]
 
@@ -24,9 +28,20 @@ def medians(report):
     return values
 
 
+def ratio(values, operation, document, peer):
+    """jsonvalue against the peer, above 1.0 in jsonvalue's favour; None if either is missing."""
+    ours = values.get(f"{operation}/{document}/jsonvalue")
+    theirs = values.get(f"{operation}/{document}/{peer}")
+    if ours is None or theirs is None:
+        return None
+    return theirs / ours if operation == "memory" else ours / theirs
+
+
 def main():
     values = medians(json.load(open(sys.argv[1])))
-    print("| document | operation | jsonvalue | " + " | ".join("vs " + title for _, title in PEERS) + " |")
+    peer_columns = " | ".join("vs " + title for _, title in PEERS) + " |"
+
+    print("| document | operation | jsonvalue | " + peer_columns)
     print("|---|---|---|" + "---|" * len(PEERS))
     for document in DOCUMENTS:
         for operation in OPERATIONS:
@@ -35,15 +50,25 @@ def main():
                 continue
             cells = []
             for peer, _ in PEERS:
-                theirs = values.get(f"{operation}/{document}/{peer}")
-                if theirs is None:
-                    cells.append("-")
-                elif operation == "memory":
-                    cells.append(f"{theirs / ours:.2f}")
-                else:
-                    cells.append(f"{ours / theirs:.2f}")
+                value = ratio(values, operation, document, peer)
+                cells.append("-" if value is None else f"{value:.2f}")
             shown = f"{ours / 1e6:.2f} MB" if operation == "memory" else f"{ours / 1e6:.0f} MB/s"
             print(f"| {document} | {operation} | {shown} | " + " | ".join(cells) + " |")
+
+    print()
+    print("| operation | " + peer_columns)
+    print("|---|" + "---|" * len(PEERS))
+    for operation in OPERATIONS:
+        cells = []
+        for peer, _ in PEERS:
+            ratios = [ratio(values, operation, document, peer) for document in DOCUMENTS]
+            ratios = [value for value in ratios if value is not None]
+            if not ratios:
+                cells.append("-")
+                continue
+            mean = math.exp(sum(math.log(value) for value in ratios) / len(ratios))
+            cells.append(f"{mean:.2f} (worst {min(ratios):.2f})")
+        print(f"| {operation} | " + " | ".join(cells) + " |")
 
 
 if __name__ == "__main__":
