@@ -1,54 +1,41 @@
-// Decodes arbitrary bytes as UTF-16 code units: the result must be valid UTF-8 (shortest
-// forms, no surrogates, nothing above U+10FFFF), whatever the input.
+// Decodes arbitrary bytes as UTF-16 code units: the result must be the UTF-8 of the same
+// characters, a surrogate pair becoming one character and an unpaired surrogate U+FFFD. The
+// UTF-8 is read back by the C library's strict decoder of the C.UTF-8 locale.
 #include <json/parse.hpp>
 
+#include <clocale>
 #include <cstddef>
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
+#include <cwchar>
 #include <vector>
 
-namespace {
-
-bool valid_utf8(const std::string& text) {
-    const auto* byte = reinterpret_cast<const unsigned char*>(text.data());
-    const auto* const end = byte + text.size();
-    while (byte != end) {
-        const unsigned char lead = *byte;
-        const int length = lead < 0x80           ? 1
-                           : (lead >> 5) == 0x6  ? 2
-                           : (lead >> 4) == 0xE  ? 3
-                           : (lead >> 3) == 0x1E ? 4
-                                                 : 0;
-        if (length == 0 || end - byte < length) {
-            return false;
-        }
-        std::uint32_t code_point = length == 1 ? lead : lead & (0x7F >> length);
-        for (int i = 1; i < length; ++i) {
-            if ((byte[i] & 0xC0) != 0x80) {
-                return false;
-            }
-            code_point = (code_point << 6) | (byte[i] & 0x3F);
-        }
-        static const std::uint32_t smallest[] = {0, 0, 0x80, 0x800, 0x10000};
-        if (code_point < smallest[length] || code_point > 0x10FFFF ||
-            (code_point >= 0xD800 && code_point <= 0xDFFF)) {
-            return false;
-        }
-        byte += length;
-    }
-    return true;
-}
-
-} // namespace
-
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
-    std::vector<char16_t> units(size / 2);
-    if (!units.empty()) {
-        std::memcpy(units.data(), data, units.size() * 2);
-    }
+    static const bool utf8_locale = std::setlocale(LC_ALL, "C.UTF-8") != nullptr;
+    std::vector<char16_t> units(size / 2 + 1);
+    std::memcpy(units.data(), data, size / 2 * 2);
+    units.pop_back();
     const std::string text = json::detail::u16_to_u8(units.data(), static_cast<int>(units.size()));
-    if (!valid_utf8(text) || (units.empty() != text.empty())) {
+    std::mbstate_t state{};
+    std::size_t at = 0;
+    for (std::size_t i = 0; i < units.size(); ++i) {
+        char32_t expected = units[i];
+        if (expected >= 0xD800 && expected <= 0xDFFF) {
+            const bool pair = expected < 0xDC00 && i + 1 < units.size() && units[i + 1] >= 0xDC00 &&
+                              units[i + 1] <= 0xDFFF;
+            expected =
+                pair ? 0x10000 + ((expected - 0xD800) << 10) + (units[++i] - 0xDC00) : 0xFFFD;
+        }
+        wchar_t decoded = 0;
+        const std::size_t length =
+            std::mbrtowc(&decoded, text.data() + at, text.size() - at, &state);
+        if (!utf8_locale || length > 4 || static_cast<char32_t>(decoded) != expected) {
+            std::abort();
+        }
+        at += length == 0 ? 1 : length; // 0: the character U+0000, one byte
+    }
+    if (at != text.size()) {
         std::abort();
     }
     return 0;

@@ -3,216 +3,180 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
-#include <cstring>
-#include <limits>
-#include <random>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+#include <map>
 
 namespace {
 
-using json::Array;
-using json::Object;
-using json::ParseResult;
-using json::Value;
+using namespace json;
+using R = ParseResult;
 
-Value parsed(std::string_view text) {
-    Value out;
-    const json::ParseReport report = json::parse(text, out, {});
-    EXPECT_TRUE(report) << text << ": " << report.message();
-    return out;
-}
-
-ParseResult code_of(std::string_view text) {
-    Value out = "untouched";
-    const ParseResult result = json::parse(text, out);
-    EXPECT_EQ(out, Value("untouched")) << "a failed parse changed out: " << text;
-    return result;
-}
-
-TEST(Parser, EveryKindOfValue) {
-    EXPECT_EQ(parsed("null"), nullptr);
-    EXPECT_EQ(parsed(" true "), true);
-    EXPECT_EQ(parsed("\tfalse\r\n"), false);
-    EXPECT_EQ(parsed("-12.5e1"), -125.0);
-    EXPECT_EQ(parsed("0").which(), 3);
-    EXPECT_EQ(parsed(R"("text")"), "text");
-    EXPECT_EQ(parsed("[]"), Array{});
-    EXPECT_EQ(parsed("{}"), Object{});
-    EXPECT_EQ(parsed(R"([1, "two", [true], {"k": null}])"),
-              (Array{1, "two", Array{true}, Object{{"k", nullptr}}}));
-}
-
-TEST(Parser, Numbers) {
-    EXPECT_EQ(parsed("1E2"), 100.0);
-    EXPECT_EQ(parsed("1e-2"), 0.01);
-    EXPECT_EQ(parsed("-0"), -0.0);
-    EXPECT_TRUE(std::signbit(boost::get<double>(parsed("-0"))));
-    EXPECT_EQ(parsed("1e400"), std::numeric_limits<double>::infinity());
-    EXPECT_EQ(parsed("-1e400"), -std::numeric_limits<double>::infinity());
-    EXPECT_EQ(parsed("1e-400"), 0.0);
-    EXPECT_EQ(parsed("123456789012345678901234567890"), 1.2345678901234568e29);
-}
-
-TEST(Parser, Strings) {
-    EXPECT_EQ(parsed(R"("\"\\\/\b\f\n\r\t")"), "\"\\/\b\f\n\r\t");
-    EXPECT_EQ(parsed(R"("\u0041\u00e9")"), "A\xC3\xA9");
-    EXPECT_EQ(parsed(R"("\ud83d\ude00")"), "\xF0\x9F\x98\x80") << "a pair is one character";
-    EXPECT_EQ(parsed(R"("\ud83dx")"), "\xEF\xBF\xBDx") << "an unpaired surrogate is U+FFFD";
-    EXPECT_EQ(parsed(R"("a\u0000b")"), std::string("a\0b", 3));
-    EXPECT_EQ(parsed("\"caf\xC3\xA9 \xFF\""), "caf\xC3\xA9 \xFF") << "bytes from 0x80 up kept";
-}
-
-TEST(Parser, DuplicateNamesLastOneWins) {
-    EXPECT_EQ(parsed(R"({"a": 1, "b": [2], "a": {"c": 3}})"),
-              (Object{{"a", Object{{"c", 3}}}, {"b", Array{2}}}));
-}
-
-TEST(Parser, FailureCodes) {
-    EXPECT_EQ(code_of(""), ParseResult::EMPTY_INPUT);
-    EXPECT_EQ(code_of(" \n\t"), ParseResult::EMPTY_INPUT);
-    EXPECT_EQ(code_of("nul"), ParseResult::INVALID_NULL);
-    EXPECT_EQ(code_of("nulL"), ParseResult::INVALID_NULL);
-    EXPECT_EQ(code_of("tru"), ParseResult::INVALID_BOOLEAN);
-    EXPECT_EQ(code_of("fals e"), ParseResult::INVALID_BOOLEAN);
-    EXPECT_EQ(code_of(R"("a\)"), ParseResult::INCOMPLETE_ESCAPE);
-    EXPECT_EQ(code_of(R"("\u12)"), ParseResult::INCOMPLETE_ESCAPE);
-    EXPECT_EQ(code_of(R"("\x")"), ParseResult::INVALID_ESCAPE);
-    EXPECT_EQ(code_of(R"("\u12g4")"), ParseResult::INVALID_UNICODE_ESCAPE);
-    EXPECT_EQ(code_of(R"({1: 2})"), ParseResult::MISSING_LEADING_QUOTE);
-    EXPECT_EQ(code_of(R"("abc)"), ParseResult::MISSING_TRAILING_QUOTE);
-    EXPECT_EQ(code_of("\"a\nb\""), ParseResult::MISSING_TRAILING_QUOTE);
-    EXPECT_EQ(code_of("-"), ParseResult::MISSING_QUANTITY_AFTER_SIGN);
-    EXPECT_EQ(code_of("-x"), ParseResult::MISSING_QUANTITY_AFTER_SIGN);
-    EXPECT_EQ(code_of("[1,]"), ParseResult::MISSING_LEADING_DIGIT);
-    EXPECT_EQ(code_of("+1"), ParseResult::MISSING_LEADING_DIGIT);
-    EXPECT_EQ(code_of("1."), ParseResult::INVALID_FRACTION);
-    EXPECT_EQ(code_of("1.e5"), ParseResult::INVALID_FRACTION);
-    EXPECT_EQ(code_of("1e"), ParseResult::INVALID_EXPONENT);
-    EXPECT_EQ(code_of("1e+"), ParseResult::INVALID_EXPONENT);
-    EXPECT_EQ(code_of("[1 2]"), ParseResult::MISSING_TRAILING_BRACKET);
-    EXPECT_EQ(code_of("[01]"), ParseResult::MISSING_TRAILING_BRACKET);
-    EXPECT_EQ(code_of(R"({"a": 1 "b": 2})"), ParseResult::MISSING_TRAILING_BRACE);
-    EXPECT_EQ(code_of(R"({"a" 1})"), ParseResult::MISSING_COLON);
-    EXPECT_EQ(code_of("[1,"), ParseResult::UNEXPECTED_END_OF_INPUT);
-    EXPECT_EQ(code_of(R"({"a":)"), ParseResult::UNEXPECTED_END_OF_INPUT);
-    EXPECT_EQ(code_of("[1] [2]"), ParseResult::UNEXPECTED_END_OF_INPUT);
-}
-
-TEST(Parser, ReportSaysWhere) {
-    Value out;
-    const json::ParseReport report = json::parse("[\n  1,\n  2 3\n]", out, {});
-    EXPECT_EQ(report.result, ParseResult::MISSING_TRAILING_BRACKET);
-    EXPECT_EQ(report.offset, 11u);
-    EXPECT_EQ(report.line, 3u);
-    EXPECT_EQ(report.column, 5u);
-    EXPECT_FALSE(report.too_deep);
-    EXPECT_EQ(report.message(), json::get_parse_result_description(report.result));
-
-    const json::ParseReport trailing = json::parse("{} x", out, {});
-    EXPECT_EQ(trailing.message(),
-              "Unexpected end of input (the text goes on after the JSON value)");
-    EXPECT_EQ(trailing.column, 4u);
-}
-
-TEST(Parser, DepthLimit) {
-    const std::string deep_ok = std::string(512, '[') + std::string(512, ']');
-    const std::string too_deep = std::string(513, '[') + std::string(513, ']');
-    Value out = 1;
-    EXPECT_EQ(json::parse(deep_ok, out), ParseResult::SUCCESS);
-    const json::ParseReport report = json::parse(too_deep, out, {});
-    EXPECT_FALSE(report);
-    EXPECT_TRUE(report.too_deep);
-    EXPECT_EQ(report.offset, 512u);
-    EXPECT_NE(report.message().find("nested deeper"), std::string::npos);
-    EXPECT_EQ(json::parse(std::string(100'000, '['), out), ParseResult::MISSING_TRAILING_BRACKET);
-    EXPECT_EQ(json::parse(too_deep, out, json::ParseOptions{513}).result, ParseResult::SUCCESS);
-
-    std::string objects;
-    for (int i = 0; i < 100'000; ++i) {
-        objects += R"({"k":)";
-    }
-    EXPECT_EQ(json::parse(objects, out), ParseResult::MISSING_TRAILING_BRACE);
-    objects += "1" + std::string(100'000, '}');
-    EXPECT_EQ(json::parse(objects, out, json::ParseOptions{100'000}).result, ParseResult::SUCCESS);
-    EXPECT_EQ(json::serialize(out), objects);
-}
-
-TEST(Parser, OutTakesTheDocumentWhateverItHeld) {
-    const Value documents[] = {Array{1, Object{}}, Object{{"a", "b"}}, "text", 2.0, nullptr};
-    const Value previous[] = {Value(), Array{3}, Object{{"x", 1}}, "old", 4.0f};
-    for (const Value& document : documents) {
-        for (const Value& before : previous) {
+// Each text into `out` holding each alternative: `out` takes the document whatever it held.
+TEST(Parser, Values) {
+    const std::pair<std::string, Value> rows[] = {
+        {"null", nullptr},
+        {" true ", true},
+        {"\tfalse\r\n", false},
+        {"-12.5e1", -125.0},
+        {"1E2", 100.0},
+        {"1e-2", 0.01},
+        {"123456789012345678901234567890", 1.2345678901234568e29},
+        {"-1e400", -HUGE_VAL},
+        {"0.00000000001e320", HUGE_VAL}, // 1e309: the exponent alone misleads
+        {"100000e-329", 0.0},            // 1e-324
+        {"4.9e-324", 5e-324},            // subnormals are in range
+        {R"("\"\\\/\b\f\n\r\t")", "\"\\/\b\f\n\r\t"},
+        {R"("\u0041\u00e9\u20AC\ud83d\ude00")", "A\xC3\xA9\xE2\x82\xAC\xF0\x9F\x98\x80"},
+        {R"("\ud83dx\ude00")", "\xEF\xBF\xBDx\xEF\xBF\xBD"}, // unpaired: U+FFFD
+        {R"("a\u0000b")", std::string("a\0b", 3)},
+        {"\"caf\xC3\xA9 \xFF\"", "caf\xC3\xA9 \xFF"}, // bytes from 0x80 up are kept
+        {"[]", Array{}},
+        {"{}", Object{}},
+        {R"([1, "two", [true], {"k": null}])",
+         Array{1, "two", Array{true}, Object{{"k", nullptr}}}},
+        {R"({"a": 1, "b": [2], "a": {"c": 3}})", Object{{"a", Object{{"c", 3}}}, {"b", Array{2}}}}};
+    for (const auto& [text, expected] : rows) {
+        for (const Value& before :
+             {Value(), Value(Array{3}), Value(Object{{"x", 1}}), Value("old")}) {
             Value out = before;
-            ASSERT_EQ(json::parse(json::serialize(document), out), ParseResult::SUCCESS);
-            EXPECT_EQ(out, document);
+            EXPECT_EQ(parse(text, out), R::SUCCESS) << text;
+            EXPECT_EQ(out, expected) << text;
+        }
+    }
+    Value zero;
+    ASSERT_EQ(parse("-1e-400", zero), R::SUCCESS);
+    EXPECT_TRUE(std::signbit(boost::get<double>(zero)));
+}
+
+// The code and the byte offset of each failure; `out` is left as it was.
+TEST(Parser, Failures) {
+    const std::tuple<std::string, R, std::size_t> rows[] = {
+        {" \n\t", R::EMPTY_INPUT, 3},
+        {"nulL", R::INVALID_NULL, 0},
+        {"[fals e]", R::INVALID_BOOLEAN, 1},
+        {R"("\u12)", R::INCOMPLETE_ESCAPE, 5},
+        {R"("\x")", R::INVALID_ESCAPE, 2},
+        {R"("\u12g4")", R::INVALID_UNICODE_ESCAPE, 5},
+        {R"({"a": 1,})", R::MISSING_LEADING_QUOTE, 8},
+        {R"("abc)", R::MISSING_TRAILING_QUOTE, 4},
+        {"\"a\nb\"", R::MISSING_TRAILING_QUOTE, 2},
+        {"-x", R::MISSING_QUANTITY_AFTER_SIGN, 1},
+        {"[1,]", R::MISSING_LEADING_DIGIT, 3},
+        {"1.e5", R::INVALID_FRACTION, 2},
+        {"1e+", R::INVALID_EXPONENT, 3},
+        {"[01]", R::MISSING_TRAILING_BRACKET, 2},
+        {"[\n  1,\n  2 3\n]", R::MISSING_TRAILING_BRACKET, 11},
+        {R"({"a": 1 "b": 2})", R::MISSING_TRAILING_BRACE, 8},
+        {R"({"a" 1})", R::MISSING_COLON, 5},
+        {R"({"a":)", R::UNEXPECTED_END_OF_INPUT, 5},
+        {"[1] [2]", R::UNEXPECTED_END_OF_INPUT, 4},
+        {std::string(513, '[') + std::string(513, ']'), R::MISSING_TRAILING_BRACKET, 512}};
+    for (const auto& [text, code, offset] : rows) {
+        Value out = Array{"untouched"};
+        const ParseReport report = parse(text, out, {});
+        EXPECT_TRUE(report.result == code && report.offset == offset) << text;
+        EXPECT_EQ(out, Array{"untouched"}) << text;
+    }
+    const auto message = [](const std::string& text) {
+        Value out;
+        const ParseReport report = parse(text, out, {});
+        return std::to_string(report.line) + ":" + std::to_string(report.column) + " " +
+               report.message() + (report.too_deep ? " too deep" : "");
+    };
+    EXPECT_EQ(message("[\n  1,\n  2 3\n]"),
+              "3:5 No trailing ']' while parsing value of type array (possible missing comma?)");
+    EXPECT_EQ(message("{} x"),
+              "1:4 Unexpected end of input (the text goes on after the JSON value)");
+    EXPECT_EQ(message(std::string(513, '[')),
+              "1:513 No trailing ']' while parsing value of type array (possible missing comma?) "
+              "(the document is nested deeper than the maximum depth) too deep");
+    Value out;
+    EXPECT_EQ(parse(std::string(512, '[') + std::string(512, ']'), out), R::SUCCESS);
+    EXPECT_TRUE(parse(std::string(513, '[') + std::string(513, ']'), out, ParseOptions{513}));
+}
+
+#ifdef JSON_DATA_DIR
+std::string read_file(const std::filesystem::path& path) {
+    std::ifstream file(path, std::ios::binary);
+    return {std::istreambuf_iterator<char>(file), {}};
+}
+
+// The parsing test suite: y_ files must parse, n_ files must fail, i_ files may do either.
+// Accepted documents, and the benchmark documents, survive a write, compact and pretty, and a
+// second parse unchanged (canada.json: numbers of every magnitude).
+TEST(Parser, Conformance) {
+    const std::filesystem::path data = JSON_DATA_DIR;
+    std::map<char, int> files;
+    std::vector<std::filesystem::path> documents = {
+        data / "bench/twitter.json", data / "bench/citm_catalog.json", data / "bench/canada.json"};
+    for (const auto& entry :
+         std::filesystem::directory_iterator(data / "JSONTestSuite/test_parsing")) {
+        const char kind = entry.path().filename().string().front();
+        ++files[kind];
+        Value document;
+        const R result = parse(read_file(entry.path()), document);
+        EXPECT_TRUE(kind == 'i' || (result == R::SUCCESS) == (kind == 'y')) << entry.path();
+        if (kind == 'y') {
+            documents.push_back(entry.path());
+        }
+    }
+    EXPECT_EQ(files, (std::map<char, int>{{'i', 35}, {'n', 188}, {'y', 95}}));
+    for (const std::filesystem::path& path : documents) {
+        Value document;
+        ASSERT_EQ(parse(read_file(path), document), R::SUCCESS) << path;
+        const std::string compact = serialize(document);
+        for (const std::string& text : {compact, pretty_print(document)}) {
+            Value again;
+            ASSERT_EQ(parse(text, again), R::SUCCESS) << path;
+            EXPECT_EQ(again, document) << path;
+            EXPECT_EQ(serialize(again), compact) << path << ": writing is not stable";
         }
     }
 }
+#endif
 
-// Random Values of every alternative a parse can give back, with awkward strings and numbers.
-class ValueGenerator {
-  public:
-    explicit ValueGenerator(unsigned seed) : random(seed) {}
+// The texts with quotes, brackets and parentheses in them, and the ends of the table.
+TEST(ParseSupport, Descriptions) {
+    const std::pair<int, const char*> rows[] = {
+        {0, "No error"},
+        {7, "Found '\"' character outside escape sequence before end of string"},
+        {17, "No trailing '}' while parsing value of type object (possible missing comma?)"},
+        {19, "Unexpected end of input"},
+        {20, "Unrecognized error code"},
+        {-1, "Unrecognized error code"}};
+    for (const auto& [code, text] : rows) {
+        EXPECT_STREQ(get_parse_result_description(static_cast<R>(code)), text) << code;
+    }
+}
 
-    Value make(int depth) {
-        switch (pick(depth > 0 ? 7 : 5)) {
-        case 0:
-            return nullptr;
-        case 1:
-            return pick(2) == 1;
-        case 2:
-            return number();
-        case 3:
-        case 4:
-            return text();
-        case 5: {
-            Array items;
-            for (int i = pick(5); i > 0; --i) {
-                items.push_back(make(depth - 1));
-            }
-            return items;
-        }
-        default: {
-            Object members;
-            for (int i = pick(5); i > 0; --i) {
-                members[text()] = make(depth - 1);
-            }
-            return members;
-        }
+TEST(ParseSupport, U16ToU8) {
+    using detail::u16_to_u8;
+    const std::pair<std::u16string, std::string> rows[] = {
+        {u"A\u007F\u0080", "A\x7F\xC2\x80"},
+        {u"\u07FF\u0800", "\xDF\xBF\xE0\xA0\x80"},
+        {u"\uD7FF\uE000\uFFFF", "\xED\x9F\xBF\xEE\x80\x80\xEF\xBF\xBF"},
+        {u"\U00010000\U0010FFFF", "\xF0\x90\x80\x80\xF4\x8F\xBF\xBF"},
+        {std::u16string(u"a\0b", 3), std::string("a\0b", 3)},
+        {u"\xD800x\xDC00\xD800", "\xEF\xBF\xBDx\xEF\xBF\xBD\xEF\xBF\xBD"}}; // unpaired: U+FFFD
+    for (auto [units, expected] : rows) {
+        EXPECT_EQ(u16_to_u8(units.data(), static_cast<int>(units.size())), expected);
+    }
+    char16_t units[] = u"abc";
+    EXPECT_EQ(u16_to_u8(units, 0), "");
+    EXPECT_EQ(u16_to_u8(nullptr, 0), "");
+    for (int count : {3, -1}) {
+        try {
+            u16_to_u8(nullptr, count);
+            ADD_FAILURE() << "no exception";
+        } catch (const std::length_error&) {
+            ADD_FAILURE() << "the count was checked before the text";
+        } catch (const std::logic_error& error) {
+            EXPECT_STREQ(error.what(), "basic_string::_M_construct null not valid");
         }
     }
-
-  private:
-    int pick(int count) { return std::uniform_int_distribution<int>(0, count - 1)(random); }
-
-    double number() {
-        std::uint64_t bits = random();
-        double value = 0;
-        std::memcpy(&value, &bits, sizeof value);
-        return std::isfinite(value) ? value : static_cast<double>(pick(1000)) - 500;
-    }
-
-    std::string text() {
-        std::string result;
-        for (int i = pick(12); i > 0; --i) {
-            result += static_cast<char>(pick(256));
-        }
-        return result;
-    }
-
-    std::mt19937_64 random;
-};
-
-TEST(Parser, GeneratedValuesRoundTripExactly) {
-    ValueGenerator generator(7);
-    for (int i = 0; i < 2000; ++i) {
-        const Value original = generator.make(4);
-        for (const std::string& text : {json::serialize(original), json::pretty_print(original)}) {
-            Value back;
-            ASSERT_EQ(json::parse(text, back), ParseResult::SUCCESS) << text;
-            ASSERT_EQ(back, original) << text;
-            ASSERT_EQ(json::serialize(back), json::serialize(original));
-        }
-    }
+    EXPECT_THROW(u16_to_u8(units, -1), std::length_error);
 }
 
 } // namespace

@@ -1,7 +1,5 @@
 #include "support/allocation_failure.hpp"
 
-#include <json/value.hpp>
-
 #include <cstdlib>
 
 namespace {
@@ -9,16 +7,23 @@ namespace {
 // Plain counters: the tests that use them run on one thread.
 std::size_t live = 0;
 std::size_t made = 0;
-std::size_t fail_at = 0; // absolute allocation number to fail; 0 for none
+std::size_t fail_at = 0; // absolute number of the allocation to fail; 0 for none
+bool fail_after = false; // whether every allocation after it fails too
 bool failed = false;
 
-void* allocate(std::size_t size) {
+} // namespace
+
+// The other forms of operator new and delete call these by default, except under valgrind, which
+// supplies its own versions of libstdc++'s: the sized delete that the library's containers call
+// is replaced too, so that every block taken here comes back here.
+void* operator new(std::size_t size) {
     ++made;
-    if (made == fail_at) {
+    void* block = nullptr;
+    if (fail_at != 0 && (made == fail_at || (fail_after && made > fail_at))) {
         failed = true;
-        throw std::bad_alloc();
+    } else {
+        block = std::malloc(size == 0 ? 1 : size);
     }
-    void* block = std::malloc(size == 0 ? 1 : size);
     if (block == nullptr) {
         throw std::bad_alloc();
     }
@@ -26,36 +31,15 @@ void* allocate(std::size_t size) {
     return block;
 }
 
-void release(void* block) noexcept {
+void operator delete(void* block) noexcept {
     if (block != nullptr) {
         --live;
         std::free(block);
     }
 }
 
-// The library makes two constant empty containers on the first copy of a container and keeps
-// them until exit: make them before any test counts blocks.
-const json::Value warm_up = json::Value(json::Value(json::Array{json::Object{}}));
-
-} // namespace
-
-void* operator new(std::size_t size) {
-    return allocate(size);
-}
-void* operator new[](std::size_t size) {
-    return allocate(size);
-}
-void operator delete(void* block) noexcept {
-    release(block);
-}
-void operator delete[](void* block) noexcept {
-    release(block);
-}
 void operator delete(void* block, std::size_t) noexcept {
-    release(block);
-}
-void operator delete[](void* block, std::size_t) noexcept {
-    release(block);
+    operator delete(block);
 }
 
 namespace test_support {
@@ -68,16 +52,14 @@ std::size_t allocations_made() {
     return made;
 }
 
-FailAllocation::FailAllocation(std::size_t n) {
+void start_failing(std::size_t n, Exhaustion mode) {
     fail_at = made + n;
+    fail_after = mode == Exhaustion::EVERY;
     failed = false;
 }
 
-FailAllocation::~FailAllocation() {
+bool stop_failing() {
     fail_at = 0;
-}
-
-bool FailAllocation::triggered() const {
     return failed;
 }
 

@@ -1,9 +1,11 @@
 #ifndef JSON_TESTS_ALLOCATION_FAILURE_HPP
 #define JSON_TESTS_ALLOCATION_FAILURE_HPP
 
-// Test executables that link allocation_failure.cpp replace the global operator new: it can
-// be told to fail one chosen allocation, and it counts the blocks alive, so a test can run an
-// operation once for every allocation it makes, failing that one, and check for leaks.
+// Test executables that link allocation_failure.cpp replace the global operator new: it counts
+// the blocks alive and can be told to fail a chosen allocation (or every allocation from a
+// chosen one on), so a test can run an operation once for every allocation it makes, failing
+// that one, and check for leaks. Nothing is allocated ahead of the tests: a block that the
+// library keeps after an operation counts as a leak of that operation.
 
 #include <cstddef>
 #include <gtest/gtest.h>
@@ -17,47 +19,55 @@ std::size_t live_blocks();
 /// Allocations made since the program started.
 std::size_t allocations_made();
 
-/// While alive, the `n`-th allocation from now throws std::bad_alloc (only that one).
-class FailAllocation {
-  public:
-    explicit FailAllocation(std::size_t n);
-    ~FailAllocation();
-    FailAllocation(const FailAllocation&) = delete;
-    FailAllocation& operator=(const FailAllocation&) = delete;
-    /// Whether the chosen allocation was reached (and failed).
-    bool triggered() const;
+/// Which allocations fail.
+enum class Exhaustion {
+    ONE,   ///< the chosen allocation only
+    EVERY, ///< the chosen allocation and every one after it: memory stays exhausted
+};
+
+/// From now on the `n`-th allocation (and with Exhaustion::EVERY every one after it) throws
+/// std::bad_alloc, until stop_failing(), which says whether an allocation failed.
+void start_failing(std::size_t n, Exhaustion mode);
+bool stop_failing();
+
+/// What for_each_failing_allocation saw.
+struct FailureRuns {
+    std::size_t allocations = 0; ///< allocations the operation makes when none fails
+    std::size_t absorbed = 0;    ///< runs in which an allocation failed but nothing was thrown
 };
 
 /// Runs `operation(state)` on a fresh `state = setup()` with the 1st, 2nd, ... allocation of
-/// the operation failing, until a run completes without reaching the failing allocation. After
-/// each run that ends in std::bad_alloc `check(state)` is called (it may use gtest assertions),
-/// and once the state is destroyed no block may have leaked. A failure may also be absorbed:
-/// releasing a tree uses a work list when it can get one and recurses when it cannot. Returns
-/// the number of allocations the operation makes.
+/// the operation failing (as `mode` says), until a run completes without a failing allocation.
+/// After each run that ends in std::bad_alloc `check(state)` is called (it may use gtest
+/// assertions), and once the state is destroyed no block may have leaked. A failure may also
+/// be absorbed: releasing a tree uses a work list when it can get one and recurses when it
+/// cannot; such runs are counted, not checked.
 template <typename Setup, typename Operation, typename Check>
-std::size_t for_each_failing_allocation(Setup setup, Operation operation, Check check) {
+FailureRuns for_each_failing_allocation(Setup setup, Operation operation, Check check,
+                                        Exhaustion mode) {
+    FailureRuns runs;
     for (std::size_t n = 1;; ++n) {
         const std::size_t before = live_blocks();
-        bool completed = false;
+        bool failed = false;
         {
             auto state = setup();
             bool threw = false;
-            {
-                FailAllocation failure(n);
-                try {
-                    operation(state);
-                } catch (const std::bad_alloc&) {
-                    threw = true;
-                }
-                completed = !failure.triggered();
+            start_failing(n, mode);
+            try {
+                operation(state);
+            } catch (const std::bad_alloc&) {
+                threw = true;
             }
+            failed = stop_failing();
+            runs.absorbed += failed && !threw ? 1 : 0;
             if (threw) {
                 check(state);
             }
         }
         EXPECT_EQ(live_blocks(), before) << "leak with allocation " << n << " failing";
-        if (completed || ::testing::Test::HasFailure()) {
-            return n - 1;
+        if (!failed || ::testing::Test::HasFailure()) {
+            runs.allocations = n - 1;
+            return runs;
         }
     }
 }
