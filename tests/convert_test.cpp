@@ -1,5 +1,7 @@
 // value_from and value_to: standard types both ways, described structs and enums, the user's
 // hooks, and where each failure is reported.
+#include "support/errors.hpp"
+
 #include <json/json.hpp>
 
 #include <boost/describe.hpp>
@@ -45,8 +47,7 @@ BOOST_DESCRIBE_STRUCT(Order, (), (items, notes))
 
 // A type with hooks of its own: written as "x,y".
 struct Point {
-    int x = 0;
-    int y = 0;
+    int x = 0, y = 0;
 };
 void to_json(json::Value& out, const Point& point) {
     out = std::to_string(point.x) + "," + std::to_string(point.y);
@@ -106,14 +107,7 @@ TEST(Convert, StandardTypesBothWays) {
 
 template <typename T>
 std::string failure(const Value& value) {
-    try {
-        value_to<T>(value);
-    } catch (const std::invalid_argument& error) {
-        return std::string("invalid: ") + error.what();
-    } catch (const std::out_of_range& error) {
-        return std::string("missing: ") + error.what();
-    }
-    return "(converted)";
+    return test_support::error_of([&] { value_to<T>(value); });
 }
 
 using IntArray3 = std::array<int, 3>;
