@@ -243,8 +243,9 @@ Value& Value::operator=(const Value& source) {
 
 namespace {
 
-// Moves what `from` holds into `to` without copying it; `from` is left with an empty
-// container or string, or its scalar. Whatever `to` held is released. Allocates only when `to`
+// Moves what `from` holds into `to` without copying it. Swap uses it only with a `to` whose
+// content is worth nothing (Undefined, or what an earlier move left behind): that content is
+// released or, for a container of `from`'s kind, swapped into `from`. Allocates only when `to`
 // must take a container of another alternative (an empty one, then swapped with `from`'s); on
 // std::bad_alloc `from` is unchanged.
 void move_content(Value& from, Value& to) {
