@@ -89,7 +89,9 @@ ParseReport parse(std::istream& in, Value& out, const ParseOptions& options) {
         } catch (...) {
             in.setstate(std::ios::badbit); // throws if the caller asked for that
         }
-        in.setstate(read_whole ? std::ios::eofbit | std::ios::failbit : std::ios::goodbit);
+        if (read_whole) {
+            in.setstate(std::ios::eofbit);
+        }
     } else {
         read_whole = !in.bad(); // at the end already: an empty text
     }

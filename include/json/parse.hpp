@@ -141,8 +141,8 @@ inline ParseReport parse(std::string_view text, Value& out, const ParseOptions& 
 /// the same guarantees for `out`. A stream that fails while it is read (its buffer throws, or
 /// it was bad from the start) is a failure too, UNEXPECTED_END_OF_INPUT with the note "the
 /// stream failed while it was read" at the offset reached, and `out` is left as it was.
-/// Exceptions the caller enabled on the stream for badbit propagate; failbit and eofbit are
-/// set at the end of the stream without an exception. Memory: the whole text is held at once.
+/// The stream ends with eofbit set (badbit after a failure); exceptions the caller enabled for
+/// those on the stream propagate. Memory: the whole text is held at once.
 JSONVALUE_API ParseReport parse(std::istream& in, Value& out, const ParseOptions& options);
 
 /// Parses as above with the default options and returns the code alone.
