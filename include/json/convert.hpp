@@ -232,16 +232,19 @@ using described_members = boost::describe::describe_members<T, boost::describe::
 template <typename T, typename Place>
 Value& place_from(const T& value, Place&& place);
 
-// Calls `place_from` for each child with a place that constructs the child as the next
-// element of `items`.
+// A place that constructs each Value as the next element of `items`.
+inline auto next_element_of(Array& items) {
+    return [&items](auto&& init) -> Value& {
+        return items.emplace_back(std::forward<decltype(init)>(init));
+    };
+}
+
 template <typename Range>
 Array array_from(const Range& range, std::size_t size) {
     Array items;
     items.reserve(size);
     for (const auto& item : range) {
-        place_from(item, [&items](auto&& init) -> Value& {
-            return items.emplace_back(std::forward<decltype(init)>(init));
-        });
+        place_from(item, next_element_of(items));
     }
     return items;
 }
@@ -278,13 +281,7 @@ auto to_alternative(const T& value) {
         Array items;
         items.reserve(std::tuple_size_v<T>);
         std::apply(
-            [&items](const auto&... item) {
-                (place_from(item,
-                            [&items](auto&& init) -> Value& {
-                                return items.emplace_back(std::forward<decltype(init)>(init));
-                            }),
-                 ...);
-            },
+            [&items](const auto&... item) { (place_from(item, next_element_of(items)), ...); },
             value);
         return items;
     } else if constexpr (category == Category::MAP) {
