@@ -1,3 +1,5 @@
+#include "kind_message.hpp"
+
 #include <json/convert.hpp>
 
 #include <array>
@@ -47,14 +49,17 @@ std::string prefixed(const std::string& token, const char* message) {
 
 } // namespace
 
-void throw_wrong_kind(const char* expected, const Value& found) {
+std::string kind_message(const char* expected, const Value& found) {
     static constexpr const char* const* NAMES[] = {
         &traits<Undefined>::name, &traits<Null>::name,        &traits<bool>::name,
         &traits<double>::name,    &traits<std::string>::name, &traits<Array>::name,
         &traits<Object>::name,    &traits<float>::name,
     };
-    throw std::invalid_argument(std::string("expected ") + expected + ", found " +
-                                *NAMES[found.which()]);
+    return std::string("expected ") + expected + ", found " + *NAMES[found.which()];
+}
+
+void throw_wrong_kind(const char* expected, const Value& found) {
+    throw std::invalid_argument(kind_message(expected, found));
 }
 
 void throw_not_in_range(double number, std::intmax_t min, std::uintmax_t max) {

@@ -1,5 +1,7 @@
 // Checked access, lookups and JSON Pointer resolution on a Value. The const overloads share
 // the code of the others: they only read.
+#include "kind_message.hpp"
+
 #include <json/convert.hpp>
 #include <json/value.hpp>
 
@@ -120,11 +122,7 @@ std::string not_found(const Value& parent, std::string_view token) {
         return index_out_of_range(index, boost::get<Array>(parent).size());
     }
     // Anything else has no values inside: say what it is.
-    try {
-        detail::throw_wrong_kind("JSON object or array", parent);
-    } catch (const std::invalid_argument& error) {
-        return error.what();
-    }
+    return detail::kind_message("JSON object or array", parent);
 }
 
 } // namespace

@@ -1,0 +1,16 @@
+#ifndef JSON_SRC_KIND_MESSAGE_HPP
+#define JSON_SRC_KIND_MESSAGE_HPP
+
+#include <json/value.hpp>
+
+#include <string>
+
+namespace json::detail {
+
+/// "expected EXPECTED, found KIND", KIND being the display name of what `found` holds: the
+/// text of every wrong-kind error.
+std::string kind_message(const char* expected, const Value& found);
+
+} // namespace json::detail
+
+#endif
