@@ -9,33 +9,13 @@
 
 #include <algorithm>
 #include <cstddef>
-#include <deque>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 namespace json {
 namespace detail {
-
-/// Calls `place` with an empty container or string of `child`'s kind (or a copy of a scalar
-/// child) to construct the Value in its final place, then swaps `child`'s content into it:
-/// a subtree changes owner without being copied.
-template <typename Place>
-void adopt(Value& child, Place place) {
-    switch (child.which()) {
-    case ARRAY_INDEX:
-        boost::get<Array>(place(Array())).swap(boost::get<Array>(child));
-        break;
-    case OBJECT_INDEX:
-        boost::get<Object>(place(Object())).swap(boost::get<Object>(child));
-        break;
-    case STRING_INDEX:
-        boost::get<std::string>(place(std::string())).swap(boost::get<std::string>(child));
-        break;
-    default:
-        place(static_cast<const Value&>(child));
-    }
-}
 
 /// One parse of one text. Iterative: open containers live on explicit stacks, so the depth a
 /// document may have is limited by ParseOptions::max_depth alone, never by the call stack.
@@ -57,9 +37,19 @@ class Parser {
   private:
     struct OpenContainer {
         bool is_object;
-        std::size_t first_value; // index into `values` of its first child
-        std::size_t first_name;  // index into `names` of its first member name
+        std::size_t first_value;  // index into `values` of its first child
+        std::size_t first_name;   // index into `names` of its first member name
+        std::size_t first_array;  // index into `finished_arrays` of its first Array child
+        std::size_t first_object; // index into `finished_objects` of its first Object child
     };
+
+    // A finished container other than the document itself waits in `finished_arrays` or
+    // `finished_objects` until its parent closes, and stands in `values` as a marker: the
+    // parser never makes Undefined or a float from text, so Undefined stands for an Array and
+    // a float for an Object. Kept apart like this, the container's content is swapped into
+    // the Value that holds it for good, and that Value is the only one ever allocated for it.
+    static constexpr int ARRAY_MARKER = UNDEFINED_INDEX;
+    static constexpr int OBJECT_MARKER = FLOAT_INDEX;
 
     ParseResult parse_value(bool& completed);
     ParseResult parse_string(std::string& text);
@@ -70,6 +60,11 @@ class Parser {
     ParseResult parse_member_name();
     ParseResult open(bool is_object);
     void close();
+    template <typename Container, typename Marker>
+    void finish(Container& content, std::vector<Container>& finished, Marker marker);
+    template <typename Alternative>
+    Value& push_value(Alternative&& value);
+    void grow_values();
     ParseResult fail(ParseResult result, const char* note = nullptr) {
         failure_note = note;
         return result;
@@ -89,7 +84,9 @@ class Parser {
     const char* failure_note = nullptr;
     bool too_deep = false;
 
-    std::deque<Value> values;       // finished values whose container is still open
+    std::vector<Value> values; // finished values whose container is still open
+    std::vector<Array> finished_arrays;
+    std::vector<Object> finished_objects;
     std::vector<std::string> names; // member names of the open objects, in document order
     std::vector<OpenContainer> open_containers;
     std::string number_text;     // reused buffer for the NUL-terminated number text
@@ -170,7 +167,7 @@ inline ParseResult Parser::parse_value(bool& completed) {
         return is_object ? parse_member_name() : ParseResult::SUCCESS;
     }
     case '"':
-        return parse_string(boost::get<std::string>(values.emplace_back(std::string())));
+        return parse_string(boost::get<std::string>(push_value(std::string())));
     case 't':
         return parse_literal("true", ParseResult::INVALID_BOOLEAN);
     case 'f':
@@ -322,7 +319,7 @@ inline ParseResult Parser::parse_number() {
         skip_digits();
     }
     number_text.assign(start, cursor);
-    values.emplace_back(string_to_double(number_text.c_str()));
+    push_value(string_to_double(number_text.c_str()));
     return ParseResult::SUCCESS;
 }
 
@@ -333,9 +330,9 @@ inline ParseResult Parser::parse_literal(std::string_view literal, ParseResult m
     }
     cursor += literal.size();
     if (literal == "null") {
-        values.emplace_back(Null());
+        push_value(Null());
     } else {
-        values.emplace_back(literal == "true");
+        push_value(literal == "true");
     }
     return ParseResult::SUCCESS;
 }
@@ -348,7 +345,8 @@ inline ParseResult Parser::open(bool is_object) {
                     "the document is nested deeper than the maximum depth");
     }
     ++cursor;
-    open_containers.push_back({is_object, values.size(), names.size()});
+    open_containers.push_back(
+        {is_object, values.size(), names.size(), finished_arrays.size(), finished_objects.size()});
     return ParseResult::SUCCESS;
 }
 
@@ -357,7 +355,36 @@ inline ParseResult Parser::open(bool is_object) {
 inline void Parser::close() {
     const OpenContainer container = open_containers.back();
     open_containers.pop_back();
+    std::size_t next_array = container.first_array;
+    std::size_t next_object = container.first_object;
+    // Calls `place` with an empty container or string of the child's kind (or a copy of a
+    // scalar child) to construct the Value in its final place, then swaps the content in: a
+    // subtree changes owner without being copied.
+    const auto adopt = [&](Value& child, auto place) {
+        switch (child.which()) {
+        case ARRAY_MARKER:
+            boost::get<Array>(place(Array())).swap(finished_arrays[next_array++]);
+            break;
+        case OBJECT_MARKER:
+            boost::get<Object>(place(Object())).swap(finished_objects[next_object++]);
+            break;
+        case STRING_INDEX:
+            boost::get<std::string>(place(std::string())).swap(boost::get<std::string>(child));
+            break;
+        default:
+            place(static_cast<const Value&>(child));
+        }
+    };
     const auto children = values.begin() + static_cast<std::ptrdiff_t>(container.first_value);
+    const auto release_children = [&] {
+        values.erase(children, values.end());
+        finished_arrays.erase(finished_arrays.begin() +
+                                  static_cast<std::ptrdiff_t>(container.first_array),
+                              finished_arrays.end());
+        finished_objects.erase(finished_objects.begin() +
+                                   static_cast<std::ptrdiff_t>(container.first_object),
+                               finished_objects.end());
+    };
     if (container.is_object) {
         Object members;
         auto name = names.begin() + static_cast<std::ptrdiff_t>(container.first_name);
@@ -372,8 +399,8 @@ inline void Parser::close() {
             });
         }
         names.resize(container.first_name);
-        values.erase(children, values.end());
-        boost::get<Object>(values.emplace_back(Object())).swap(members);
+        release_children();
+        finish(members, finished_objects, 0.0F); // OBJECT_MARKER
     } else {
         Array items;
         items.reserve(values.size() - container.first_value);
@@ -381,9 +408,41 @@ inline void Parser::close() {
             adopt(*child,
                   [&items](const auto& initial) -> Value& { return items.emplace_back(initial); });
         }
-        values.erase(children, values.end());
-        boost::get<Array>(values.emplace_back(Array())).swap(items);
+        release_children();
+        finish(items, finished_arrays, Undefined()); // ARRAY_MARKER
     }
+}
+
+// Leaves a closed container as the last finished value: as the document itself once no
+// container is open any more, otherwise set aside, behind its marker, for its parent.
+template <typename Container, typename Marker>
+void Parser::finish(Container& content, std::vector<Container>& finished, Marker marker) {
+    if (open_containers.empty()) {
+        boost::get<Container>(push_value(Container())).swap(content);
+    } else {
+        finished.push_back(std::move(content));
+        push_value(marker);
+    }
+}
+
+template <typename Alternative>
+Value& Parser::push_value(Alternative&& value) {
+    if (values.size() == values.capacity()) {
+        grow_values();
+    }
+    return values.emplace_back(std::forward<Alternative>(value));
+}
+
+// std::vector would copy the values when it grows (a Value has no move constructor), so they
+// are swapped into the larger storage instead: no string is copied. Only scalars, strings
+// and markers live here, so none of the swaps can fail.
+inline void Parser::grow_values() {
+    std::vector<Value> larger;
+    larger.reserve(std::max<std::size_t>(64, 2 * values.capacity()));
+    for (Value& value : values) {
+        larger.emplace_back().swap(value);
+    }
+    values.swap(larger);
 }
 
 } // namespace detail
