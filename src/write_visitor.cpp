@@ -1,12 +1,11 @@
 #include "write_visitor.hpp"
 
+#include <json/detail/byte_scan.hpp>
 #include <number_text.hpp>
 
 #include <array>
 #include <cmath>
-#include <cstdint>
 #include <cstring>
-#include <emmintrin.h>
 #include <limits>
 #include <vector>
 
@@ -33,49 +32,6 @@ constexpr std::array<char, 256> make_escape_table() {
 }
 
 constexpr std::array<char, 256> ESCAPES = make_escape_table();
-
-// Whether any of the eight bytes of `word` needs an escape: below 0x20, '"', '/' or '\\'.
-// The bit tricks are exact for "any byte" (they only blur which byte), which is all the scan
-// below asks of them.
-inline bool needs_escape(std::uint64_t word) {
-    constexpr std::uint64_t ones = 0x0101010101010101;
-    constexpr std::uint64_t highs = 0x8080808080808080;
-    const auto has_zero = [](std::uint64_t v) { return (v - ones) & ~v & highs; };
-    const std::uint64_t below_space = (word - ones * 0x20) & ~word & highs;
-    return (below_space | has_zero(word ^ (ones * '"')) | has_zero(word ^ (ones * '/')) |
-            has_zero(word ^ (ones * '\\'))) != 0;
-}
-
-// The first byte at or after `from` that needs an escape, or `end`: sixteen bytes at a time
-// with SSE2 (part of every x86-64 processor, so no run-time dispatch), then eight at a time,
-// then one by one.
-inline const char* next_escape(const char* from, const char* end) {
-    const __m128i quote = _mm_set1_epi8('"');
-    const __m128i slash = _mm_set1_epi8('/');
-    const __m128i backslash = _mm_set1_epi8('\\');
-    const __m128i last_control = _mm_set1_epi8(0x1F);
-    while (end - from >= 16) {
-        const __m128i bytes = _mm_loadu_si128(reinterpret_cast<const __m128i*>(from));
-        // Unsigned min(byte, 0x1F) == byte exactly for the bytes below 0x20.
-        const __m128i control = _mm_cmpeq_epi8(_mm_min_epu8(bytes, last_control), bytes);
-        const __m128i special = _mm_or_si128(
-            _mm_cmpeq_epi8(bytes, quote),
-            _mm_or_si128(_mm_cmpeq_epi8(bytes, slash), _mm_cmpeq_epi8(bytes, backslash)));
-        const int hits = _mm_movemask_epi8(_mm_or_si128(control, special));
-        if (hits != 0) {
-            return from + __builtin_ctz(static_cast<unsigned>(hits));
-        }
-        from += 16;
-    }
-    std::uint64_t word = 0;
-    while (end - from >= 8 && (std::memcpy(&word, from, 8), !needs_escape(word))) {
-        from += 8;
-    }
-    while (from != end && ESCAPES[static_cast<unsigned char>(*from)] == 0) {
-        ++from;
-    }
-    return from;
-}
 
 } // namespace
 
@@ -218,7 +174,7 @@ void WriteVisitor::write_string(const std::string& text) const {
     const char* const end = run + text.size();
     for (;;) {
         // Bytes that need no escape go out as one run.
-        const char* const byte = next_escape(run, end);
+        const char* const byte = find_special_byte<true>(run, end);
         write_bytes(run, static_cast<std::size_t>(byte - run));
         if (byte == end) {
             break;

@@ -5,10 +5,12 @@
 // declarations it uses. Header-level: it is compiled into its users and reaches the library
 // only through the Value model and the two exported conversions.
 
+#include <json/detail/byte_scan.hpp>
 #include <json/value.hpp>
 
 #include <algorithm>
 #include <cstddef>
+#include <cstring>
 #include <string>
 #include <string_view>
 #include <utility>
@@ -208,9 +210,7 @@ inline ParseResult Parser::parse_string(std::string& text) {
         // Bytes that need no attention are copied in one piece; bytes from 0x80 up are kept
         // as they are.
         const char* const run = cursor;
-        cursor = std::find_if(cursor, end, [](char c) {
-            return c == '"' || c == '\\' || static_cast<unsigned char>(c) < 0x20;
-        });
+        cursor = find_special_byte<false>(cursor, end);
         text.append(run, cursor);
         if (cursor == end) {
             return fail(ParseResult::MISSING_TRAILING_QUOTE, "the string is not closed");
@@ -318,8 +318,19 @@ inline ParseResult Parser::parse_number() {
         }
         skip_digits();
     }
-    number_text.assign(start, cursor);
-    push_value(string_to_double(number_text.c_str()));
+    // The number reader wants NUL-terminated text: a short number is copied to the stack,
+    // only a longer one goes through the reused string.
+    const auto length = static_cast<std::size_t>(cursor - start);
+    constexpr std::size_t short_number = 64;
+    if (length < short_number) {
+        char text[short_number];
+        std::memcpy(text, start, length);
+        text[length] = '\0';
+        push_value(string_to_double(text));
+    } else {
+        number_text.assign(start, cursor);
+        push_value(string_to_double(number_text.c_str()));
+    }
     return ParseResult::SUCCESS;
 }
 

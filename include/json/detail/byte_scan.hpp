@@ -1,0 +1,70 @@
+#ifndef JSON_DETAIL_BYTE_SCAN_HPP
+#define JSON_DETAIL_BYTE_SCAN_HPP
+
+// The scan shared by the writer and the parser for the bytes of a string that need attention.
+
+#include <cstdint>
+#include <cstring>
+
+#if defined(__SSE2__)
+#include <emmintrin.h>
+#endif
+
+namespace json::detail {
+
+/// Whether `byte` needs attention inside a JSON string: a control character (below 0x20),
+/// '"' or '\\', and also '/' when `WithSlash` (the writer escapes it; the parser keeps it).
+template <bool WithSlash>
+constexpr bool is_special_byte(unsigned char byte) {
+    return byte < 0x20 || byte == '"' || byte == '\\' || (WithSlash && byte == '/');
+}
+
+/// The first byte in [from, end) for which is_special_byte holds, or `end`. Linear; sixteen
+/// bytes at a time with SSE2 where the compiler targets it (every x86-64 processor, so no
+/// run-time dispatch), eight at a time otherwise, then one by one. Reads nothing outside
+/// [from, end). Throws nothing.
+template <bool WithSlash>
+inline const char* find_special_byte(const char* from, const char* end) noexcept {
+#if defined(__SSE2__)
+    const __m128i quote = _mm_set1_epi8('"');
+    const __m128i slash = _mm_set1_epi8(WithSlash ? '/' : '"');
+    const __m128i backslash = _mm_set1_epi8('\\');
+    const __m128i last_control = _mm_set1_epi8(0x1F);
+    while (end - from >= 16) {
+        const __m128i bytes = _mm_loadu_si128(reinterpret_cast<const __m128i*>(from));
+        // Unsigned min(byte, 0x1F) == byte exactly for the bytes below 0x20.
+        const __m128i control = _mm_cmpeq_epi8(_mm_min_epu8(bytes, last_control), bytes);
+        const __m128i special = _mm_or_si128(
+            _mm_cmpeq_epi8(bytes, quote),
+            _mm_or_si128(_mm_cmpeq_epi8(bytes, slash), _mm_cmpeq_epi8(bytes, backslash)));
+        const int hits = _mm_movemask_epi8(_mm_or_si128(control, special));
+        if (hits != 0) {
+            return from + __builtin_ctz(static_cast<unsigned>(hits));
+        }
+        from += 16;
+    }
+#endif
+    // Eight bytes as one word: the bit tricks are exact for "some byte matches" (they only
+    // blur which one), which is all that is asked of them here.
+    constexpr std::uint64_t ones = 0x0101010101010101;
+    constexpr std::uint64_t highs = 0x8080808080808080;
+    const auto has_zero_byte = [](std::uint64_t v) { return (v - ones) & ~v & highs; };
+    const auto has_special = [&](std::uint64_t word) {
+        const std::uint64_t below_space = (word - ones * 0x20) & ~word & highs;
+        const std::uint64_t slash = WithSlash ? has_zero_byte(word ^ (ones * '/')) : 0;
+        return (below_space | slash | has_zero_byte(word ^ (ones * '"')) |
+                has_zero_byte(word ^ (ones * '\\'))) != 0;
+    };
+    std::uint64_t word = 0;
+    while (end - from >= 8 && (std::memcpy(&word, from, 8), !has_special(word))) {
+        from += 8;
+    }
+    while (from != end && !is_special_byte<WithSlash>(static_cast<unsigned char>(*from))) {
+        ++from;
+    }
+    return from;
+}
+
+} // namespace json::detail
+
+#endif
