@@ -33,6 +33,25 @@ constexpr std::array<char, 256> make_escape_table() {
 
 constexpr std::array<char, 256> ESCAPES = make_escape_table();
 
+// The length of the NUL-terminated text in a zero-filled number buffer of `size` bytes. The
+// text is short: sixteen bytes at a time with SSE2 beat a call to strnlen.
+template <std::size_t size>
+std::size_t text_length(const char* text) {
+#if defined(__SSE2__)
+    static_assert(size % 16 == 0, "the buffer is read in whole blocks");
+    for (std::size_t at = 0; at != size; at += 16) {
+        const __m128i bytes = _mm_loadu_si128(reinterpret_cast<const __m128i*>(text + at));
+        const int nul = _mm_movemask_epi8(_mm_cmpeq_epi8(bytes, _mm_setzero_si128()));
+        if (nul != 0) {
+            return at + static_cast<std::size_t>(__builtin_ctz(static_cast<unsigned>(nul)));
+        }
+    }
+    return size;
+#else
+    return strnlen(text, size);
+#endif
+}
+
 } // namespace
 
 // Writes the contents of one container, and of every container inside it, from an explicit
@@ -169,6 +188,19 @@ void WriteVisitor::write_object(const Object& members) const {
 }
 
 void WriteVisitor::write_string(const std::string& text) const {
+    constexpr std::size_t short_size = 16;
+    if (text.size() < short_size && text.capacity() >= short_size - 1 &&
+        short_run_is_plain<true>(text.data(), text.size())) {
+        // Most keys and many values: a short string with nothing to escape. Its storage holds
+        // at least sixteen bytes (capacity plus the NUL), so all of them are copied at once
+        // and only the string's own are kept.
+        char* const quoted = buffer.reserve(short_size + 2);
+        quoted[0] = '"';
+        std::memcpy(quoted + 1, text.data(), short_size);
+        quoted[1 + text.size()] = '"';
+        buffer.commit(quoted + text.size() + 2);
+        return;
+    }
     buffer.put('"');
     const char* run = text.data();
     const char* const end = run + text.size();
@@ -214,7 +246,7 @@ void WriteVisitor::write_number_text(Number number, int (*format)(char*, Number)
         char* const text = buffer.reserve(size);
         std::memset(text, 0, size);
         format(text, number);
-        buffer.commit(text + strnlen(text, size));
+        buffer.commit(text + text_length<size>(text));
     }
 }
 

@@ -3,6 +3,7 @@
 
 // The scan shared by the writer and the parser for the bytes of a string that need attention.
 
+#include <cstddef>
 #include <cstdint>
 #include <cstring>
 
@@ -19,6 +20,21 @@ constexpr bool is_special_byte(unsigned char byte) {
     return byte < 0x20 || byte == '"' || byte == '\\' || (WithSlash && byte == '/');
 }
 
+#if defined(__SSE2__)
+/// Bit i is set when byte i of the sixteen at `from` needs attention (see is_special_byte).
+template <bool WithSlash>
+inline int special_bytes_of_16(const char* from) noexcept {
+    const __m128i bytes = _mm_loadu_si128(reinterpret_cast<const __m128i*>(from));
+    // Unsigned min(byte, 0x1F) == byte exactly for the bytes below 0x20.
+    const __m128i control = _mm_cmpeq_epi8(_mm_min_epu8(bytes, _mm_set1_epi8(0x1F)), bytes);
+    const __m128i special =
+        _mm_or_si128(_mm_cmpeq_epi8(bytes, _mm_set1_epi8('"')),
+                     _mm_or_si128(_mm_cmpeq_epi8(bytes, _mm_set1_epi8(WithSlash ? '/' : '"')),
+                                  _mm_cmpeq_epi8(bytes, _mm_set1_epi8('\\'))));
+    return _mm_movemask_epi8(_mm_or_si128(control, special));
+}
+#endif
+
 /// The first byte in [from, end) for which is_special_byte holds, or `end`. Linear; sixteen
 /// bytes at a time with SSE2 where the compiler targets it (every x86-64 processor, so no
 /// run-time dispatch), eight at a time otherwise, then one by one. Reads nothing outside
@@ -26,18 +42,8 @@ constexpr bool is_special_byte(unsigned char byte) {
 template <bool WithSlash>
 inline const char* find_special_byte(const char* from, const char* end) noexcept {
 #if defined(__SSE2__)
-    const __m128i quote = _mm_set1_epi8('"');
-    const __m128i slash = _mm_set1_epi8(WithSlash ? '/' : '"');
-    const __m128i backslash = _mm_set1_epi8('\\');
-    const __m128i last_control = _mm_set1_epi8(0x1F);
     while (end - from >= 16) {
-        const __m128i bytes = _mm_loadu_si128(reinterpret_cast<const __m128i*>(from));
-        // Unsigned min(byte, 0x1F) == byte exactly for the bytes below 0x20.
-        const __m128i control = _mm_cmpeq_epi8(_mm_min_epu8(bytes, last_control), bytes);
-        const __m128i special = _mm_or_si128(
-            _mm_cmpeq_epi8(bytes, quote),
-            _mm_or_si128(_mm_cmpeq_epi8(bytes, slash), _mm_cmpeq_epi8(bytes, backslash)));
-        const int hits = _mm_movemask_epi8(_mm_or_si128(control, special));
+        const int hits = special_bytes_of_16<WithSlash>(from);
         if (hits != 0) {
             return from + __builtin_ctz(static_cast<unsigned>(hits));
         }
@@ -63,6 +69,19 @@ inline const char* find_special_byte(const char* from, const char* end) noexcept
         ++from;
     }
     return from;
+}
+
+/// Whether none of the `count` bytes at `from` needs attention, where `count` is below 16 and
+/// sixteen bytes are readable at `from` (as in any std::string whose capacity is at least 15:
+/// the bytes past its size are read but play no part). One comparison for a short string
+/// instead of a loop. Throws nothing.
+template <bool WithSlash>
+inline bool short_run_is_plain(const char* from, std::size_t count) noexcept {
+#if defined(__SSE2__)
+    return (special_bytes_of_16<WithSlash>(from) & ((1 << count) - 1)) == 0;
+#else
+    return find_special_byte<WithSlash>(from, from + count) == from + count;
+#endif
 }
 
 } // namespace json::detail
