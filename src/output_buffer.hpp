@@ -20,58 +20,64 @@ namespace json::detail {
 /// String: for json::serialize and json::pretty_print, whose stream nobody else sees. The text
 /// is what a std::ostringstream in its default state would hold: newlines widened by the
 /// global locale, escapes as its default formatting writes them; flushing such a stream does
-/// nothing, so nothing is flushed.
+/// nothing, so nothing is flushed. The text is written straight into the string's own
+/// storage, which grows geometrically (its size runs ahead of the text until flush()), so
+/// no byte is copied on the way but when the string reallocates.
 class OutputBuffer {
   public:
-    explicit OutputBuffer(std::ostream& out) : out(&out), text(nullptr) {}
+    explicit OutputBuffer(std::ostream& out)
+        : out(&out), text(nullptr), start(storage), cursor(storage), limit(storage + CAPACITY) {}
     explicit OutputBuffer(std::string& text)
         : out(nullptr), text(&text), widened_newline_known(true),
-          widened_newline(std::use_facet<std::ctype<char>>(std::locale()).widen('\n')) {}
+          widened_newline(std::use_facet<std::ctype<char>>(std::locale()).widen('\n')) {
+        point_into_text(text.size());
+    }
     OutputBuffer(const OutputBuffer&) = delete;
     OutputBuffer& operator=(const OutputBuffer&) = delete;
 
     void append(const char* bytes, std::size_t count) {
-        if (count > CAPACITY - used) {
-            flush();
-            if (count >= CAPACITY) {
-                deliver(bytes, count);
+        if (count > room()) {
+            if (text == nullptr && count >= CAPACITY) {
+                flush();
+                deliver(bytes, count); // too big to gather: straight to the stream
                 return;
             }
+            make_room(count);
         }
-        std::memcpy(data + used, bytes, count);
-        used += count;
+        std::memcpy(cursor, bytes, count);
+        cursor += count;
     }
 
     void put(char c) {
-        if (used == CAPACITY) {
-            flush();
+        if (cursor == limit) {
+            make_room(1);
         }
-        data[used++] = c;
+        *cursor++ = c;
     }
 
     /// `count` copies of `c`, filled straight into the buffer a piece at a time.
     void fill(char c, std::size_t count) {
         while (count != 0) {
-            if (used == CAPACITY) {
-                flush();
+            if (cursor == limit) {
+                make_room(count);
             }
-            const std::size_t piece = std::min(count, CAPACITY - used);
-            std::memset(data + used, c, piece);
-            used += piece;
+            const std::size_t piece = std::min(count, room());
+            std::memset(cursor, c, piece);
+            cursor += piece;
             count -= piece;
         }
     }
 
-    /// Room for at least `count` bytes (at most CAPACITY), flushing first when needed; the
-    /// bytes written there count once commit() is given the end of them.
+    /// Room for at least `count` bytes (at most CAPACITY), made first when needed; the bytes
+    /// written there count once commit() is given the end of them.
     char* reserve(std::size_t count) {
-        if (count > CAPACITY - used) {
-            flush();
+        if (count > room()) {
+            make_room(count);
         }
-        return data + used;
+        return cursor;
     }
 
-    void commit(const char* end) { used = static_cast<std::size_t>(end - data); }
+    void commit(char* end) { cursor = end; }
 
     /// A widened newline, then a flush, with every byte before it delivered.
     void new_line();
@@ -79,31 +85,54 @@ class OutputBuffer {
     /// "\u" and the byte as four hexadecimal digits.
     void unicode_escape(unsigned char byte);
 
-    /// Hands everything buffered on.
+    /// Hands everything buffered on: to the stream, or (for a string) trims the string to the
+    /// text written so far.
     void flush() {
-        if (used != 0) {
-            deliver(data, used);
-            used = 0;
+        if (text != nullptr) {
+            text->resize(static_cast<std::size_t>(cursor - start));
+            point_into_text(text->size());
+        } else if (cursor != start) {
+            deliver(start, static_cast<std::size_t>(cursor - start));
+            cursor = start;
         }
     }
 
     static constexpr std::size_t CAPACITY = std::size_t{16} * 1024;
 
   private:
-    void deliver(const char* bytes, std::size_t count) {
-        if (out != nullptr) {
-            out->write(bytes, static_cast<std::streamsize>(count));
-        } else {
-            text->append(bytes, count);
+    std::size_t room() const { return static_cast<std::size_t>(limit - cursor); }
+
+    // Stream: delivers what is gathered. String: enlarges the string to at least twice its
+    // size and at least `count` bytes beyond the text; std::bad_alloc leaves the text intact.
+    void make_room(std::size_t count) {
+        if (text == nullptr) {
+            flush();
+            return;
         }
+        const auto used = static_cast<std::size_t>(cursor - start);
+        text->resize(std::max({used + count, 2 * text->size(), CAPACITY}));
+        point_into_text(used);
+    }
+
+    // Points the buffer at the string's storage, the text ending `used` bytes in.
+    void point_into_text(std::size_t used) {
+        start = text->data();
+        cursor = start + used;
+        limit = start + text->size();
+    }
+
+    void deliver(const char* bytes, std::size_t count) {
+        out->write(bytes, static_cast<std::streamsize>(count));
     }
 
     std::ostream* out;
     std::string* text;
     bool widened_newline_known = false;
     char widened_newline = '\n';
-    std::size_t used = 0;
-    char data[CAPACITY];
+    char* start = nullptr;
+    char* cursor = nullptr;
+    char* limit = nullptr;
+    char storage[CAPACITY]; // the stream's gathering buffer (unused for a string)
 };
 
 } // namespace json::detail
