@@ -68,7 +68,8 @@ class OutputBuffer {
         }
     }
 
-    /// Room for at least `count` bytes (at most CAPACITY), made first when needed; the bytes
+    /// Room for at least `count` bytes (at most CAPACITY on a stream; any number in a
+    /// string), made first when needed; the bytes
     /// written there count once commit() is given the end of them.
     char* reserve(std::size_t count) {
         if (count > room()) {
@@ -79,8 +80,9 @@ class OutputBuffer {
 
     void commit(char* end) { cursor = end; }
 
-    /// A widened newline, then a flush, with every byte before it delivered.
-    void new_line();
+    /// A widened newline, then a flush, with every byte before it delivered; then `indent`
+    /// spaces.
+    void new_line(std::size_t indent);
 
     /// "\u" and the byte as four hexadecimal digits.
     void unicode_escape(unsigned char byte);

@@ -3,6 +3,7 @@
 #include <json/detail/byte_scan.hpp>
 #include <number_text.hpp>
 
+#include <algorithm>
 #include <array>
 #include <cmath>
 #include <cstring>
@@ -126,17 +127,17 @@ class WriteVisitor::ContainerWriter {
         }
         frame.empty = false;
         if (record.pretty) {
-            record.new_line();
-            record.write_indent(4 * frame.level + 4);
+            record.new_line(4 * frame.level + 4);
         }
     }
 
     void close(const Frame& frame) {
         if (record.pretty) {
             if (!frame.empty) {
-                record.new_line();
+                record.new_line(4 * frame.level);
+            } else {
+                record.write_indent(4 * frame.level);
             }
-            record.write_indent(4 * frame.level);
         }
         record.write_bytes(frame.is_object ? "}" : "]", 1);
     }
@@ -250,8 +251,8 @@ void WriteVisitor::write_number_text(Number number, int (*format)(char*, Number)
     }
 }
 
-void WriteVisitor::new_line() const {
-    buffer.new_line();
+void WriteVisitor::new_line(int indent) const {
+    buffer.new_line(static_cast<std::size_t>(std::max(indent, 0)));
 }
 
 void WriteVisitor::write_indent(int count) const {
@@ -260,9 +261,13 @@ void WriteVisitor::write_indent(int count) const {
     }
 }
 
-void OutputBuffer::new_line() {
+void OutputBuffer::new_line(std::size_t indent) {
     if (out == nullptr) {
-        put(widened_newline);
+        // Nothing to flush in a string: the line break and its indentation in one piece.
+        char* const line = reserve(1 + indent);
+        *line = widened_newline;
+        std::memset(line + 1, ' ', indent);
+        commit(line + 1 + indent);
         return;
     }
     if (!widened_newline_known) {
@@ -275,6 +280,7 @@ void OutputBuffer::new_line() {
     put(widened_newline);
     flush();
     out->flush();
+    fill(' ', indent);
 }
 
 // On a stream: \u, then the digits from the stream's own formatting, with its flags restored

@@ -37,8 +37,8 @@ class WriteVisitor : public boost::static_visitor<void> {
     void write_number(float number) const;
     void write_array(const Array& items) const;
     void write_object(const Object& members) const;
-    /// The widened '\n', then a flush: exactly what std::endl does.
-    void new_line() const;
+    /// The widened '\n', then a flush (exactly what std::endl does), then `indent` spaces.
+    void new_line(int indent) const;
     /// `count` spaces.
     void write_indent(int count) const;
 
