@@ -7,6 +7,7 @@
 #include <fstream>
 #include <iterator>
 #include <map>
+#include <sstream>
 
 namespace {
 
@@ -36,7 +37,15 @@ TEST(Parser, Values) {
         {"{}", Object{}},
         {R"([1, "two", [true], {"k": null}])",
          Array{1, "two", Array{true}, Object{{"k", nullptr}}}},
-        {R"({"a": 1, "b": [2], "a": {"c": 3}})", Object{{"a", Object{{"c", 3}}}, {"b", Array{2}}}}};
+        {R"({"a": 1, "b": [2], "a": {"c": 3}})", Object{{"a", Object{{"c", 3}}}, {"b", Array{2}}}},
+        // Finished arrays and objects waiting for their parents, in and out of order.
+        {R"([[1, {"x": [2, {}]}], {}, [[], [3]], {"y": {"z": []}, "w": [{}]}])",
+         Array{Array{1, Object{{"x", Array{2, Object{}}}}}, Object{}, Array{Array{}, Array{3}},
+               Object{{"y", Object{{"z", Array{}}}}, {"w", Array{Object{}}}}}},
+        // Whitespace runs longer than one sixteen-byte block, of each kind.
+        {std::string(17, '\t') + "[" + std::string(16, '\r') + "1," + std::string(33, '\n') + "2" +
+             std::string(20, ' ') + "]" + std::string(18, ' '),
+         Array{1, 2}}};
     for (const auto& [text, expected] : rows) {
         for (const Value& before :
              {Value(), Value(Array{3}), Value(Object{{"x", 1}}), Value("old")}) {
@@ -127,6 +136,15 @@ TEST(Parser, Conformance) {
         Value document;
         ASSERT_EQ(parse(read_file(path), document), R::SUCCESS) << path;
         const std::string compact = serialize(document);
+        EXPECT_EQ(Value(document), document) << path << ": the copy differs";
+        for (const bool pretty : {false, true}) {
+            Serializer serializer;
+            serializer.pretty_print(pretty);
+            std::ostringstream on_stream;
+            serializer.write(on_stream, document);
+            EXPECT_EQ(on_stream.str(), pretty ? pretty_print(document) : compact)
+                << path << ": a stream and a string receive different text";
+        }
         for (const std::string& text : {compact, pretty_print(document)}) {
             Value again;
             ASSERT_EQ(parse(text, again), R::SUCCESS) << path;

@@ -62,6 +62,27 @@ TEST(Serializer, CompactAndPrettyText) {
     }
 }
 
+// Strings shorter than sixteen bytes with nothing to escape are written by a shortcut: an
+// escape at either end of any such length must still be found.
+TEST(Serializer, ShortStringsFindEveryEscape) {
+    const struct {
+        char byte;
+        const char* escaped;
+    } specials[] = {
+        {'"', "\\\""}, {'\\', "\\\\"}, {'/', "\\/"}, {'\n', "\\n"}, {'\x1f', "\\u001f"}};
+    for (std::size_t length = 1; length <= 17; ++length) {
+        for (const auto& special : specials) {
+            for (const std::size_t at : {std::size_t{0}, length - 1}) {
+                std::string text(length, 'a');
+                text[at] = special.byte;
+                const std::string expected =
+                    '"' + text.substr(0, at) + special.escaped + text.substr(at + 1) + '"';
+                EXPECT_EQ(serialize(text), expected) << "length " << length << ", at " << at;
+            }
+        }
+    }
+}
+
 // On a caller's stream the \u digits come from the stream's own formatting: the writer sets
 // only the base, the fill and the width, and gives the flags back.
 TEST(Serializer, EscapesOnAStreamFollowItsFlags) {

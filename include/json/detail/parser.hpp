@@ -72,9 +72,9 @@ class Parser {
         return result;
     }
     void skip_whitespace() {
-        while (cursor != end &&
-               (*cursor == ' ' || *cursor == '\n' || *cursor == '\r' || *cursor == '\t')) {
-            ++cursor;
+        // Most tokens follow the previous one directly: no scan is set up for them.
+        if (cursor != end && is_whitespace(*cursor)) {
+            cursor = detail::skip_whitespace(cursor + 1, end);
         }
     }
     bool at(char c) const { return cursor != end && *cursor == c; }
