@@ -11,6 +11,7 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstring>
+#include <optional>
 #include <string>
 #include <string_view>
 #include <utility>
@@ -54,6 +55,7 @@ class Parser {
     static constexpr int OBJECT_MARKER = FLOAT_INDEX;
 
     ParseResult parse_value(bool& completed);
+    std::optional<std::string_view> plain_string();
     ParseResult parse_string(std::string& text);
     ParseResult parse_escape(std::string& text);
     ParseResult parse_unicode_escapes(std::string& text);
@@ -169,6 +171,10 @@ inline ParseResult Parser::parse_value(bool& completed) {
         return is_object ? parse_member_name() : ParseResult::SUCCESS;
     }
     case '"':
+        if (const std::optional<std::string_view> plain = plain_string()) {
+            push_value(std::string(*plain));
+            return ParseResult::SUCCESS;
+        }
         return parse_string(boost::get<std::string>(push_value(std::string())));
     case 't':
         return parse_literal("true", ParseResult::INVALID_BOOLEAN);
@@ -189,8 +195,10 @@ inline ParseResult Parser::parse_member_name() {
     if (*cursor != '"') {
         return fail(ParseResult::MISSING_LEADING_QUOTE, "a member name must be a string");
     }
-    if (const ParseResult result = parse_string(names.emplace_back());
-        result != ParseResult::SUCCESS) {
+    if (const std::optional<std::string_view> plain = plain_string()) {
+        names.emplace_back(*plain);
+    } else if (const ParseResult result = parse_string(names.emplace_back());
+               result != ParseResult::SUCCESS) {
         return result;
     }
     skip_whitespace();
@@ -202,6 +210,19 @@ inline ParseResult Parser::parse_member_name() {
     }
     ++cursor;
     return ParseResult::SUCCESS;
+}
+
+// The bytes between the quotes of the string at the cursor, when there is nothing to unescape
+// or refuse in them (most strings), with the cursor moved past the closing quote; the string
+// is then built in one piece. Otherwise nothing, and the cursor stays on the opening quote.
+inline std::optional<std::string_view> Parser::plain_string() {
+    const char* const first = cursor + 1;
+    const char* const stop = find_special_byte<false>(first, end);
+    if (stop == end || *stop != '"') {
+        return std::nullopt;
+    }
+    cursor = stop + 1;
+    return std::string_view(first, static_cast<std::size_t>(stop - first));
 }
 
 inline ParseResult Parser::parse_string(std::string& text) {
