@@ -301,44 +301,53 @@ inline ParseResult Parser::parse_unicode_escapes(std::string& text) {
 }
 
 inline ParseResult Parser::parse_number() {
-    const auto digit_here = [this] { return cursor != end && *cursor >= '0' && *cursor <= '9'; };
+    // Scanned with a local pointer, which the compiler keeps in a register (the member would
+    // be written back at every digit); `cursor` takes it at every exit.
+    const char* const start = cursor;
+    const char* here = cursor;
+    const auto digit_here = [&here, this] { return here != end && *here >= '0' && *here <= '9'; };
     const auto skip_digits = [&] {
         while (digit_here()) {
-            ++cursor;
+            ++here;
         }
     };
-    const char* const start = cursor;
-    if (at('-')) {
-        ++cursor;
+    const auto here_is = [&here, this](char c) { return here != end && *here == c; };
+    const auto fail_here = [&](ParseResult result, const char* note = nullptr) {
+        cursor = here;
+        return fail(result, note);
+    };
+    if (here_is('-')) {
+        ++here;
         if (!digit_here()) {
-            return fail(ParseResult::MISSING_QUANTITY_AFTER_SIGN);
+            return fail_here(ParseResult::MISSING_QUANTITY_AFTER_SIGN);
         }
     }
     if (!digit_here()) {
-        return fail(ParseResult::MISSING_LEADING_DIGIT, "no JSON value starts here");
+        return fail_here(ParseResult::MISSING_LEADING_DIGIT, "no JSON value starts here");
     }
-    if (*cursor == '0') {
-        ++cursor; // no further digits after a leading zero
+    if (*here == '0') {
+        ++here; // no further digits after a leading zero
     } else {
         skip_digits();
     }
-    if (at('.')) {
-        ++cursor;
+    if (here_is('.')) {
+        ++here;
         if (!digit_here()) {
-            return fail(ParseResult::INVALID_FRACTION);
+            return fail_here(ParseResult::INVALID_FRACTION);
         }
         skip_digits();
     }
-    if (at('e') || at('E')) {
-        ++cursor;
-        if (at('+') || at('-')) {
-            ++cursor;
+    if (here_is('e') || here_is('E')) {
+        ++here;
+        if (here_is('+') || here_is('-')) {
+            ++here;
         }
         if (!digit_here()) {
-            return fail(ParseResult::INVALID_EXPONENT);
+            return fail_here(ParseResult::INVALID_EXPONENT);
         }
         skip_digits();
     }
+    cursor = here;
     // The number reader wants NUL-terminated text: a short number is copied to the stack,
     // only a longer one goes through the reused string.
     const auto length = static_cast<std::size_t>(cursor - start);
@@ -403,8 +412,16 @@ inline void Parser::close() {
         case STRING_INDEX:
             boost::get<std::string>(place(std::string())).swap(boost::get<std::string>(child));
             break;
+        case DOUBLE_INDEX:
+            // Scalars are constructed from their alternative, inline: no call to the general
+            // copy constructor, which has containers to deal with.
+            place(boost::get<double>(child));
+            break;
+        case BOOL_INDEX:
+            place(boost::get<bool>(child));
+            break;
         default:
-            place(static_cast<const Value&>(child));
+            place(Null()); // the parser makes no other alternative
         }
     };
     const auto children = values.begin() + static_cast<std::ptrdiff_t>(container.first_value);
