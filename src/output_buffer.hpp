@@ -68,9 +68,9 @@ class OutputBuffer {
         }
     }
 
-    /// Room for at least `count` bytes (at most CAPACITY on a stream; any number in a
-    /// string), made first when needed; the bytes
-    /// written there count once commit() is given the end of them.
+    /// Room for at least `count` bytes (at most CAPACITY on a stream, any number in a
+    /// string), made first when needed; the bytes written there count once commit() is
+    /// given the end of them.
     char* reserve(std::size_t count) {
         if (count > room()) {
             make_room(count);

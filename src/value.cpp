@@ -78,8 +78,8 @@ using CopyJobs = std::vector<CopyJob>;
 // whole container at once (exact size, tree structure taken over without comparing a key or
 // rebalancing) while the depth of the call stack stays bounded.
 // A constant-initialised pointer: nothing is constructed on first use or destroyed at exit.
-// The initial-exec model makes each access a single load (the library reserves eight bytes
-// of static TLS, which a dlopen of it can always get).
+// The initial-exec model makes each access a single load. It costs eight bytes of static
+// TLS, which glibc's reserve for libraries loaded later provides (dlopen checked).
 thread_local CopyJobs* pending_copies __attribute__((tls_model("initial-exec"))) = nullptr;
 
 // Sets the list of pending containers for the lifetime of one deep copy.

@@ -28,6 +28,7 @@ inline int special_bytes_of_16(const char* from) noexcept {
     const __m128i bytes = _mm_loadu_si128(reinterpret_cast<const __m128i*>(from));
     // Unsigned min(byte, 0x1F) == byte exactly for the bytes below 0x20.
     const __m128i control = _mm_cmpeq_epi8(_mm_min_epu8(bytes, _mm_set1_epi8(0x1F)), bytes);
+    // Without the slash, its comparison repeats the quote's: one shape for both scans.
     const __m128i special =
         _mm_or_si128(_mm_cmpeq_epi8(bytes, _mm_set1_epi8('"')),
                      _mm_or_si128(_mm_cmpeq_epi8(bytes, _mm_set1_epi8(WithSlash ? '/' : '"')),
