@@ -42,6 +42,9 @@ TEST(Parser, Values) {
         {R"([[1, {"x": [2, {}]}], {}, [[], [3]], {"y": {"z": []}, "w": [{}]}])",
          Array{Array{1, Object{{"x", Array{2, Object{}}}}}, Object{}, Array{Array{}, Array{3}},
                Object{{"y", Object{{"z", Array{}}}}, {"w", Array{Object{}}}}}},
+        // Digit runs around a sixteen-byte block.
+        {"[-65.61361699999997711,1234567890123456,4.1234567890123456789e-0000000000000001]",
+         Array{-65.61361699999997711, 1234567890123456.0, 0.41234567890123456789}},
         // Whitespace runs longer than one sixteen-byte block, of each kind.
         {std::string(17, '\t') + "[" + std::string(16, '\r') + "1," + std::string(33, '\n') + "2" +
              std::string(20, ' ') + "]" + std::string(18, ' '),
@@ -76,6 +79,9 @@ TEST(Parser, Failures) {
         {"1.e5", R::INVALID_FRACTION, 2},
         {"1e+", R::INVALID_EXPONENT, 3},
         {"[01]", R::MISSING_TRAILING_BRACKET, 2},
+        // The bytes next to the digits, inside a sixteen-byte block.
+        {"[123456789/]" + std::string(16, ' '), R::MISSING_TRAILING_BRACKET, 10},
+        {"[0.123456789:]" + std::string(16, ' '), R::MISSING_TRAILING_BRACKET, 12},
         {"[\n  1,\n  2 3\n]", R::MISSING_TRAILING_BRACKET, 11},
         {R"({"a": 1 "b": 2})", R::MISSING_TRAILING_BRACE, 8},
         {R"({"a" 1})", R::MISSING_COLON, 5},

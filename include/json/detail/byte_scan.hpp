@@ -1,8 +1,8 @@
 #ifndef JSON_DETAIL_BYTE_SCAN_HPP
 #define JSON_DETAIL_BYTE_SCAN_HPP
 
-// Byte scans: the bytes of a string that need attention (shared by the writer and the parser)
-// and the whitespace between the parser's tokens.
+// Byte scans: the bytes of a string that need attention (shared by the writer and the parser),
+// the whitespace between the parser's tokens and the digits of its numbers.
 
 #include <cstddef>
 #include <cstdint>
@@ -110,6 +110,29 @@ inline const char* skip_whitespace(const char* from, const char* end) noexcept {
     }
 #endif
     while (from != end && is_whitespace(*from)) {
+        ++from;
+    }
+    return from;
+}
+
+/// The first byte in [from, end) that is not a decimal digit, or `end`. Linear; sixteen bytes at
+/// a time with SSE2 (a coordinate has seventeen digits). Throws nothing.
+inline const char* skip_digits(const char* from, const char* end) noexcept {
+#if defined(__SSE2__)
+    while (end - from >= 16) {
+        const __m128i bytes = _mm_loadu_si128(reinterpret_cast<const __m128i*>(from));
+        // A digit's distance above '0', wrapping, is at most 9 exactly for the ten digits.
+        const __m128i above_zero = _mm_sub_epi8(bytes, _mm_set1_epi8('0'));
+        const __m128i digit =
+            _mm_cmpeq_epi8(_mm_min_epu8(above_zero, _mm_set1_epi8(9)), above_zero);
+        const unsigned others = ~static_cast<unsigned>(_mm_movemask_epi8(digit)) & 0xFFFFU;
+        if (others != 0) {
+            return from + __builtin_ctz(others);
+        }
+        from += 16;
+    }
+#endif
+    while (from != end && *from >= '0' && *from <= '9') {
         ++from;
     }
     return from;

@@ -306,11 +306,7 @@ inline ParseResult Parser::parse_number() {
     const char* const start = cursor;
     const char* here = cursor;
     const auto digit_here = [&here, this] { return here != end && *here >= '0' && *here <= '9'; };
-    const auto skip_digits = [&] {
-        while (digit_here()) {
-            ++here;
-        }
-    };
+    const auto skip_digits = [&] { here = detail::skip_digits(here, end); };
     const auto here_is = [&here, this](char c) { return here != end && *here == c; };
     const auto fail_here = [&](ParseResult result, const char* note = nullptr) {
         cursor = here;
