@@ -84,20 +84,23 @@ TEST(Serializer, ShortStringsFindEveryEscape) {
     }
 }
 
-// On a caller's stream the \u digits come from the stream's own formatting: the writer sets
-// only the base, the fill and the width, and gives the flags back.
-// Integral numbers take a shortcut in the number text; it must write what the shortest
-// floating format writes: fixed notation, or scientific where that is shorter (1e+05), around
-// every power of ten, at the limits of exact integers and beyond them.
+// Integral numbers take a shortcut in the number text; it must write what the shortest floating
+// format writes: fixed notation, or scientific where that is strictly shorter (1e+05).
+template <typename Number>
+void expect_text_as_floating_format(Number number) {
+    char expected[64];
+    *std::to_chars(expected, expected + 63, number).ptr = '\0';
+    EXPECT_EQ(serialize(number), expected) << "for " << expected;
+}
+
+// Around every power of ten, and at the limits of exact integers and beyond them.
 template <typename Number>
 void expect_integral_text_as_floating_format(Number scale_limit) {
     for (Number scale = 1; scale < scale_limit; scale *= 10) {
         for (const Number significand : {1, 2, 9, 10, 11, 99, 101, 123, 1000, 4321}) {
             for (const Number number : {significand * scale, significand * scale - 1,
                                         significand * scale + 1, -significand * scale}) {
-                char expected[64];
-                *std::to_chars(expected, expected + 63, number).ptr = '\0';
-                EXPECT_EQ(serialize(number), expected) << "for " << expected;
+                expect_text_as_floating_format(number);
             }
         }
     }
@@ -107,11 +110,10 @@ TEST(Serializer, IntegralNumbersAsTheShortestFloatingFormat) {
     expect_integral_text_as_floating_format(1e18);
     expect_integral_text_as_floating_format(1e9f);
     for (const double number : {0.0, 9007199254740991.0, 9007199254740992.0, -9007199254740993.0,
-                                16777215.0, 4503599627370496.5}) {
-        char expected[64];
-        *std::to_chars(expected, expected + 63, number).ptr = '\0';
-        EXPECT_EQ(serialize(number), expected);
+                                16777215.0, 4503599627370496.5, 1e22}) {
+        expect_text_as_floating_format(number);
     }
+    // Scientific only where it is strictly shorter.
     EXPECT_EQ(serialize(16777216.0f), "16777216");
     EXPECT_EQ(serialize(100000.0), "1e+05");
     EXPECT_EQ(serialize(10000.0), "10000");
@@ -119,6 +121,8 @@ TEST(Serializer, IntegralNumbersAsTheShortestFloatingFormat) {
     EXPECT_EQ(serialize(-12000000.0), "-1.2e+07");
 }
 
+// On a caller's stream the \u digits come from the stream's own formatting: the writer sets
+// only the base, the fill and the width, and gives the flags back.
 TEST(Serializer, EscapesOnAStreamFollowItsFlags) {
     const struct {
         const char* text;
