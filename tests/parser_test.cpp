@@ -38,6 +38,17 @@ TEST(Parser, Values) {
         {R"([1, "two", [true], {"k": null}])",
          Array{1, "two", Array{true}, Object{{"k", nullptr}}}},
         {R"({"a": 1, "b": [2], "a": {"c": 3}})", Object{{"a", Object{{"c", 3}}}, {"b", Array{2}}}},
+        // Members are taken in key order: names sharing eight-byte prefixes, empty, holding NUL
+        // or bytes from 0x80 up, and repeated names far apart (the last one wins).
+        {R"({"abcdefgh2": 1, "abcdefgh1": 2, "": 3, "abcdefgh": [4], "\u0000": 5, "\u00e9": 6,
+            "abcdefgh1": {"x": 7}, "B": 8, "": 9, "abcdefgh1": [10]})",
+         Object{{"abcdefgh2", 1},
+                {"abcdefgh1", Array{10}},
+                {"", 9},
+                {"abcdefgh", Array{4}},
+                {std::string(1, '\0'), 5},
+                {"\xC3\xA9", 6},
+                {"B", 8}}},
         // Finished arrays and objects waiting for their parents, in and out of order.
         {R"([[1, {"x": [2, {}]}], {}, [[], [3]], {"y": {"z": []}, "w": [{}]}])",
          Array{Array{1, Object{{"x", Array{2, Object{}}}}}, Object{}, Array{Array{}, Array{3}},

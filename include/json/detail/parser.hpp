@@ -10,6 +10,7 @@
 
 #include <algorithm>
 #include <cstddef>
+#include <cstdint>
 #include <cstring>
 #include <optional>
 #include <string>
@@ -54,6 +55,13 @@ class Parser {
     static constexpr int ARRAY_MARKER = UNDEFINED_INDEX;
     static constexpr int OBJECT_MARKER = FLOAT_INDEX;
 
+    // A member of an object being closed, in the order the map wants its keys.
+    struct MemberInKeyOrder {
+        std::uint64_t name_prefix; // see name_prefix()
+        std::size_t child;         // position among the object's children
+        std::size_t slot;          // for a marker, index of its finished container
+    };
+
     ParseResult parse_value(bool& completed);
     std::optional<std::string_view> plain_string();
     ParseResult parse_string(std::string& text);
@@ -93,6 +101,7 @@ class Parser {
     std::vector<Object> finished_objects;
     std::vector<std::string> names; // member names of the open objects, in document order
     std::vector<OpenContainer> open_containers;
+    std::vector<MemberInKeyOrder> members_in_key_order; // reused by every object closed
     std::string number_text;     // reused buffer for the NUL-terminated number text
     std::vector<char16_t> utf16; // reused buffer for a run of \u escapes
 };
@@ -389,21 +398,46 @@ inline ParseResult Parser::open(bool is_object) {
 
 // Builds the innermost open container at its final size from the values parsed for it,
 // adopting each one without a copy, and leaves it as one finished value.
+// The first eight bytes of a name as a big-endian number, zero-padded: where two names' prefixes
+// differ, they order the names as the map does (bytes unsigned, a proper prefix first). Reads
+// eight bytes of the at least sixteen a std::string's storage always has, and keeps only the
+// name's own.
+inline std::uint64_t name_prefix(const std::string& name) {
+    std::uint64_t word = 0;
+    std::memcpy(&word, name.data(), sizeof word);
+#if __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__
+    word = __builtin_bswap64(word);
+#endif
+    const std::size_t kept = std::min<std::size_t>(name.size(), sizeof word);
+    return kept == 0 ? 0 : word & ~std::uint64_t{0} << (8 * (sizeof word - kept));
+}
+
 inline void Parser::close() {
     const OpenContainer container = open_containers.back();
     open_containers.pop_back();
+    // The finished containers of the children, in document order.
     std::size_t next_array = container.first_array;
     std::size_t next_object = container.first_object;
+    const auto slot_of = [&](const Value& child) -> std::size_t {
+        switch (child.which()) {
+        case ARRAY_MARKER:
+            return next_array++;
+        case OBJECT_MARKER:
+            return next_object++;
+        default:
+            return 0;
+        }
+    };
     // Calls `place` with an empty container or string of the child's kind (or a copy of a
     // scalar child) to construct the Value in its final place, then swaps the content in: a
     // subtree changes owner without being copied.
-    const auto adopt = [&](Value& child, auto place) {
+    const auto adopt = [&](Value& child, std::size_t slot, auto place) {
         switch (child.which()) {
         case ARRAY_MARKER:
-            boost::get<Array>(place(Array())).swap(finished_arrays[next_array++]);
+            boost::get<Array>(place(Array())).swap(finished_arrays[slot]);
             break;
         case OBJECT_MARKER:
-            boost::get<Object>(place(Object())).swap(finished_objects[next_object++]);
+            boost::get<Object>(place(Object())).swap(finished_objects[slot]);
             break;
         case STRING_INDEX:
             boost::get<std::string>(place(std::string())).swap(boost::get<std::string>(child));
@@ -431,17 +465,46 @@ inline void Parser::close() {
                                finished_objects.end());
     };
     if (container.is_object) {
+        // The members go into the map in key order, each placed at its end after a single key
+        // comparison; the order is found with comparisons of eight-byte prefixes, most of which
+        // settle it without comparing the names themselves.
+        const auto names_of = names.begin() + static_cast<std::ptrdiff_t>(container.first_name);
+        members_in_key_order.clear();
+        for (auto child = children; child != values.end(); ++child) {
+            const auto position = static_cast<std::size_t>(child - children);
+            members_in_key_order.push_back(
+                {name_prefix(names_of[static_cast<std::ptrdiff_t>(position)]), position,
+                 slot_of(*child)});
+        }
+        const auto name_of = [&](const MemberInKeyOrder& member) -> const std::string& {
+            return names_of[static_cast<std::ptrdiff_t>(member.child)];
+        };
+        // Equal names keep document order: the later member then replaces the earlier one.
+        const auto key_order = [&](const MemberInKeyOrder& left, const MemberInKeyOrder& right) {
+            if (left.name_prefix != right.name_prefix) {
+                return left.name_prefix < right.name_prefix;
+            }
+            const int order = name_of(left).compare(name_of(right));
+            return order != 0 ? order < 0 : left.child < right.child;
+        };
+        // Documents written by programs often list names in order already: a check that stops
+        // at the first name out of order costs less than sorting what is sorted.
+        if (!std::is_sorted(members_in_key_order.begin(), members_in_key_order.end(), key_order)) {
+            std::sort(members_in_key_order.begin(), members_in_key_order.end(), key_order);
+        }
         Object members;
-        auto name = names.begin() + static_cast<std::ptrdiff_t>(container.first_name);
-        for (auto child = children; child != values.end(); ++child, ++name) {
-            // A later member with the same name replaces an earlier one.
-            adopt(*child, [&members, &name](const auto& initial) -> Value& {
-                auto [member, inserted] = members.try_emplace(std::move(*name), initial);
-                if (!inserted) {
-                    member->second = initial;
-                }
-                return member->second;
-            });
+        for (const MemberInKeyOrder& member : members_in_key_order) {
+            std::string& name = names_of[static_cast<std::ptrdiff_t>(member.child)];
+            adopt(children[static_cast<std::ptrdiff_t>(member.child)], member.slot,
+                  [&](const auto& initial) -> Value& {
+                      const std::size_t count = members.size();
+                      const auto placed =
+                          members.emplace_hint(members.end(), std::move(name), initial);
+                      if (members.size() == count) {
+                          placed->second = initial; // a repeated name: the later member wins
+                      }
+                      return placed->second;
+                  });
         }
         names.resize(container.first_name);
         release_children();
@@ -450,7 +513,7 @@ inline void Parser::close() {
         Array items;
         items.reserve(values.size() - container.first_value);
         for (auto child = children; child != values.end(); ++child) {
-            adopt(*child,
+            adopt(*child, slot_of(*child),
                   [&items](const auto& initial) -> Value& { return items.emplace_back(initial); });
         }
         release_children();
