@@ -396,15 +396,17 @@ inline ParseResult Parser::open(bool is_object) {
     return ParseResult::SUCCESS;
 }
 
-// Builds the innermost open container at its final size from the values parsed for it,
-// adopting each one without a copy, and leaves it as one finished value.
 // The first eight bytes of a name as a big-endian number, zero-padded: where two names' prefixes
-// differ, they order the names as the map does (bytes unsigned, a proper prefix first). Reads
-// eight bytes of the at least sixteen a std::string's storage always has, and keeps only the
-// name's own.
+// differ, they order the names as the map does (bytes unsigned, a proper prefix first).
 inline std::uint64_t name_prefix(const std::string& name) {
     std::uint64_t word = 0;
-    std::memcpy(&word, name.data(), sizeof word);
+    // The storage holds capacity() + 1 bytes (with the NUL), so eight can be read at once in
+    // every common library (a short string's buffer has sixteen); only the name's are kept.
+    if (name.capacity() >= sizeof word - 1) {
+        std::memcpy(&word, name.data(), sizeof word);
+    } else {
+        std::memcpy(&word, name.data(), name.size());
+    }
 #if __BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__
     word = __builtin_bswap64(word);
 #endif
@@ -412,6 +414,8 @@ inline std::uint64_t name_prefix(const std::string& name) {
     return kept == 0 ? 0 : word & ~std::uint64_t{0} << (8 * (sizeof word - kept));
 }
 
+// Builds the innermost open container at its final size from the values parsed for it,
+// adopting each one without a copy, and leaves it as one finished value.
 inline void Parser::close() {
     const OpenContainer container = open_containers.back();
     open_containers.pop_back();
