@@ -77,22 +77,30 @@ class WriteVisitor::ContainerWriter {
     }
 
   private:
+    // Built in place by emplace_back: a frame assembled on the stack and then copied in was
+    // read back as whole blocks before its narrow fields had reached memory, which stalled
+    // every opened container.
     struct Frame {
+        Frame(int level, const Array& items)
+            : level(level), is_object(false), item(items.begin()), items_end(items.end()) {}
+        Frame(int level, const Object& members)
+            : level(level), is_object(true), member(members.begin()), members_end(members.end()) {}
+
         int level;
         bool is_object;
-        bool empty;
+        bool empty = true;
         Array::const_iterator item, items_end;
         Object::const_iterator member, members_end;
     };
 
     void open(const Array& items, int level) {
         record.write_bytes("[", 1);
-        open_containers.push_back({level, false, true, items.begin(), items.end(), {}, {}});
+        open_containers.emplace_back(level, items);
     }
 
     void open(const Object& members, int level) {
         record.write_bytes("{", 1);
-        open_containers.push_back({level, true, true, {}, {}, members.begin(), members.end()});
+        open_containers.emplace_back(level, members);
     }
 
     // The next element, after its separator; null at the end of the array.
