@@ -8,6 +8,7 @@
 #include <cmath>
 #include <cstring>
 #include <limits>
+#include <type_traits>
 #include <vector>
 
 namespace json::detail {
@@ -149,10 +150,10 @@ class WriteVisitor::ContainerWriter {
     void write_value(const Value& value, int level) {
         switch (value.which()) {
         case ARRAY_INDEX:
-            open(boost::get<Array>(value), level);
+            write_container(boost::get<Array>(value), level);
             break;
         case OBJECT_INDEX:
-            open(boost::get<Object>(value), level);
+            write_container(boost::get<Object>(value), level);
             break;
         case UNDEFINED_INDEX:
             record.write_bytes("null", 4);
@@ -160,6 +161,24 @@ class WriteVisitor::ContainerWriter {
         default:
             // A scalar's text does not depend on its level: the record itself writes it.
             boost::apply_visitor(record, value);
+        }
+    }
+
+    // An empty container has nothing left to write after its brackets, so it is written whole
+    // instead of being opened; it is the same text open() and close() would give.
+    template <typename Container>
+    void write_container(const Container& container, int level) {
+        if (!container.empty()) {
+            open(container, level);
+            return;
+        }
+        const char* const brackets = std::is_same_v<Container, Object> ? "{}" : "[]";
+        if (record.pretty) {
+            record.write_bytes(brackets, 1);
+            record.write_indent(4 * level);
+            record.write_bytes(brackets + 1, 1);
+        } else {
+            record.write_bytes(brackets, 2);
         }
     }
 
