@@ -56,7 +56,11 @@ TEST(Serializer, CompactAndPrettyText) {
         {Object{{"a", Array{true, nullptr}}, {"b/", "x"}}, R"({"a":[true,null],"b\/":"x"})",
          "{\n    \"a\":[\n        true,\n        null\n    ],\n    \"b\\/\":\"x\"\n}"},
         {Array{Object{{"x", Object{{"p", Array{}}}}}}, R"([{"x":{"p":[]}}])",
-         "[\n    {\n        \"x\":{\n            \"p\":[            ]\n        }\n    }\n]"}};
+         "[\n    {\n        \"x\":{\n            \"p\":[            ]\n        }\n    }\n]"},
+        // Indentation deeper than sixteen spaces, on the way in and out.
+        {Array{Array{Array{Array{Array{1}}}}}, "[[[[[1]]]]]",
+         "[\n    [\n        [\n            [\n                [\n                    1\n"
+         "                ]\n            ]\n        ]\n    ]\n]"}};
     for (const auto& row : rows) {
         EXPECT_EQ(serialize(row.value), row.compact);
         EXPECT_EQ(pretty_print(row.value), row.pretty ? row.pretty : row.compact);
