@@ -314,6 +314,18 @@ inline ParseResult Parser::parse_number() {
     // be written back at every digit); `cursor` takes it at every exit.
     const char* const start = cursor;
     const char* here = cursor;
+    // The number reader wants NUL-terminated text: a short number is copied to the stack,
+    // only a longer one goes through the reused string. Where the input has them, its next
+    // 32 bytes are copied before the number is scanned (usually all of it), so that those
+    // stores have reached the cache when the reader takes the text in wide loads: loads over
+    // stores still in flight would wait for them.
+    constexpr std::size_t short_number = 64;
+    constexpr std::size_t copied_ahead = 32;
+    char text[short_number];
+    const bool copy_ahead = end - start >= static_cast<std::ptrdiff_t>(copied_ahead);
+    if (copy_ahead) {
+        std::memcpy(text, start, copied_ahead);
+    }
     const auto digit_here = [&here, this] { return here != end && *here >= '0' && *here <= '9'; };
     const auto skip_digits = [&] { here = detail::skip_digits(here, end); };
     const auto here_is = [&here, this](char c) { return here != end && *here == c; };
@@ -353,13 +365,11 @@ inline ParseResult Parser::parse_number() {
         skip_digits();
     }
     cursor = here;
-    // The number reader wants NUL-terminated text: a short number is copied to the stack,
-    // only a longer one goes through the reused string.
     const auto length = static_cast<std::size_t>(cursor - start);
-    constexpr std::size_t short_number = 64;
     if (length < short_number) {
-        char text[short_number];
-        std::memcpy(text, start, length);
+        if (!copy_ahead || length >= copied_ahead) {
+            std::memcpy(text, start, length);
+        }
         text[length] = '\0';
         push_value(string_to_double(text));
     } else {
