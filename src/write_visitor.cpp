@@ -119,8 +119,7 @@ class WriteVisitor::ContainerWriter {
         }
         start_entry(frame);
         const auto& [key, value] = *frame.member++;
-        record.write_string(key);
-        record.write_bytes(":", 1);
+        record.write_member_name(key);
         return &value;
     }
 
@@ -210,17 +209,30 @@ void WriteVisitor::write_object(const Object& members) const {
 }
 
 void WriteVisitor::write_string(const std::string& text) const {
+    write_quoted<false>(text);
+}
+
+void WriteVisitor::write_member_name(const std::string& name) const {
+    write_quoted<true>(name);
+}
+
+template <bool with_colon>
+void WriteVisitor::write_quoted(const std::string& text) const {
     constexpr std::size_t short_size = 16;
+    constexpr std::size_t colon = with_colon ? 1 : 0;
     if (text.size() < short_size && text.capacity() >= short_size - 1 &&
         short_run_is_plain<true>(text.data(), text.size())) {
         // Most keys and many values: a short string with nothing to escape. Its storage holds
         // at least sixteen bytes (capacity plus the NUL), so all of them are copied at once
-        // and only the string's own are kept.
-        char* const quoted = buffer.reserve(short_size + 2);
+        // and only the string's own are kept; a member name's colon comes in the same piece.
+        char* const quoted = buffer.reserve(short_size + 2 + colon);
         quoted[0] = '"';
         std::memcpy(quoted + 1, text.data(), short_size);
         quoted[1 + text.size()] = '"';
-        buffer.commit(quoted + text.size() + 2);
+        if (with_colon) {
+            quoted[2 + text.size()] = ':';
+        }
+        buffer.commit(quoted + text.size() + 2 + colon);
         return;
     }
     buffer.put('"');
@@ -243,6 +255,9 @@ void WriteVisitor::write_string(const std::string& text) const {
         run = byte + 1;
     }
     buffer.put('"');
+    if (with_colon) {
+        buffer.put(':');
+    }
 }
 
 void WriteVisitor::write_number(double number) const {

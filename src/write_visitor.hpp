@@ -32,6 +32,8 @@ class WriteVisitor : public boost::static_visitor<void> {
 
     /// The quoted, escaped string; used for string values and object keys.
     void write_string(const std::string& text) const;
+    /// A member name as write_string writes it, and its colon.
+    void write_member_name(const std::string& name) const;
     /// The number's text; NaN and the infinities as the strings "NaN", "Inf", "-Inf".
     void write_number(double number) const;
     void write_number(float number) const;
@@ -46,6 +48,8 @@ class WriteVisitor : public boost::static_visitor<void> {
     class ContainerWriter;
 
     void write_bytes(const char* bytes, std::size_t count) const { buffer.append(bytes, count); }
+    template <bool with_colon>
+    void write_quoted(const std::string& text) const;
     template <typename Number>
     void write_number_text(Number number, int (*format)(char*, Number)) const;
 
