@@ -39,17 +39,24 @@ inline int special_bytes_of_16(const char* from) noexcept {
 
 /// The first byte in [from, end) for which is_special_byte holds, or `end`. Linear; sixteen
 /// bytes at a time with SSE2 where the compiler targets it (every x86-64 processor, so no
-/// run-time dispatch), eight at a time otherwise, then one by one. Reads nothing outside
-/// [from, end). Throws nothing.
+/// run-time dispatch) when the range has sixteen, eight at a time otherwise, then one by one. Reads
+/// nothing outside [from, end). Throws nothing.
 template <bool WithSlash>
 inline const char* find_special_byte(const char* from, const char* end) noexcept {
 #if defined(__SSE2__)
-    while (end - from >= 16) {
-        const int hits = special_bytes_of_16<WithSlash>(from);
-        if (hits != 0) {
-            return from + __builtin_ctz(static_cast<unsigned>(hits));
+    if (end - from >= 16) {
+        const char* const last_block = end - 16;
+        while (from < last_block) {
+            const int hits = special_bytes_of_16<WithSlash>(from);
+            if (hits != 0) {
+                return from + __builtin_ctz(static_cast<unsigned>(hits));
+            }
+            from += 16;
         }
-        from += 16;
+        // The last sixteen bytes of the range, instead of a byte loop over the rest: those
+        // of them scanned already (fewer than sixteen) had nothing, so the first hit is new.
+        const int hits = special_bytes_of_16<WithSlash>(last_block);
+        return hits != 0 ? last_block + __builtin_ctz(static_cast<unsigned>(hits)) : end;
     }
 #endif
     // Eight bytes as one word: the bit tricks are exact for "some byte matches" (they only
