@@ -217,7 +217,7 @@ void WriteVisitor::write_member_name(const std::string& name) const {
 }
 
 template <bool with_colon>
-void WriteVisitor::write_quoted(const std::string& text) const {
+inline void WriteVisitor::write_quoted(const std::string& text) const {
     constexpr std::size_t short_size = 16;
     constexpr std::size_t colon = with_colon ? 1 : 0;
     if (text.size() < short_size && text.capacity() >= short_size - 1 &&
@@ -235,6 +235,12 @@ void WriteVisitor::write_quoted(const std::string& text) const {
         buffer.commit(quoted + text.size() + 2 + colon);
         return;
     }
+    write_escaped<with_colon>(text);
+}
+
+// Kept out of line, so that the short path above stays small enough to be inlined.
+template <bool with_colon>
+__attribute__((noinline)) void WriteVisitor::write_escaped(const std::string& text) const {
     buffer.put('"');
     const char* run = text.data();
     const char* const end = run + text.size();

@@ -50,6 +50,9 @@ class WriteVisitor : public boost::static_visitor<void> {
     void write_bytes(const char* bytes, std::size_t count) const { buffer.append(bytes, count); }
     template <bool with_colon>
     void write_quoted(const std::string& text) const;
+    /// write_quoted's general case: a string of any length, its escapes written out.
+    template <bool with_colon>
+    void write_escaped(const std::string& text) const;
     template <typename Number>
     void write_number_text(Number number, int (*format)(char*, Number)) const;
 
