@@ -82,7 +82,23 @@ class OutputBuffer {
 
     /// A widened newline, then a flush, with every byte before it delivered; then `indent`
     /// spaces.
-    void new_line(std::size_t indent);
+    void new_line(std::size_t indent) {
+        if (out != nullptr) {
+            new_line_on_stream(indent);
+            return;
+        }
+        // Nothing to flush in a string: the line break and its indentation in one piece, the
+        // spaces copied in whole sixteen-byte blocks (cheaper than a call to memset for the few
+        // of them a line has) into room reserved for them; only `indent` of them are kept.
+        static constexpr char SPACES[17] = "                ";
+        constexpr std::size_t block = sizeof SPACES - 1;
+        char* const line = reserve(1 + indent + block);
+        *line = widened_newline;
+        for (std::size_t at = 0; at < indent; at += block) {
+            std::memcpy(line + 1 + at, SPACES, block);
+        }
+        commit(line + 1 + indent);
+    }
 
     /// "\u" and the byte as four hexadecimal digits.
     void unicode_escape(unsigned char byte);
@@ -102,6 +118,8 @@ class OutputBuffer {
     static constexpr std::size_t CAPACITY = std::size_t{16} * 1024;
 
   private:
+    void new_line_on_stream(std::size_t indent);
+
     std::size_t room() const { return static_cast<std::size_t>(limit - cursor); }
 
     // Stream: delivers what is gathered. String: enlarges the string to at least twice its

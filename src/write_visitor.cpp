@@ -293,31 +293,13 @@ void WriteVisitor::write_number_text(Number number, int (*format)(char*, Number)
     }
 }
 
-void WriteVisitor::new_line(int indent) const {
-    buffer.new_line(static_cast<std::size_t>(std::max(indent, 0)));
-}
-
 void WriteVisitor::write_indent(int count) const {
     if (count > 0) {
         buffer.fill(' ', static_cast<std::size_t>(count));
     }
 }
 
-void OutputBuffer::new_line(std::size_t indent) {
-    if (out == nullptr) {
-        // Nothing to flush in a string: the line break and its indentation in one piece, the
-        // spaces copied in whole sixteen-byte blocks (cheaper than a call to memset for the few
-        // of them a line has) into room reserved for them; only `indent` of them are kept.
-        static constexpr char SPACES[17] = "                ";
-        constexpr std::size_t block = sizeof SPACES - 1;
-        char* const line = reserve(1 + indent + block);
-        *line = widened_newline;
-        for (std::size_t at = 0; at < indent; at += block) {
-            std::memcpy(line + 1 + at, SPACES, block);
-        }
-        commit(line + 1 + indent);
-        return;
-    }
+void OutputBuffer::new_line_on_stream(std::size_t indent) {
     if (!widened_newline_known) {
         // widen() throws std::bad_cast for a locale without std::ctype<char>: the text so far
         // must be on the stream by then. Once it has answered, its answer is reused.

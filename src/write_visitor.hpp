@@ -5,6 +5,7 @@
 
 #include <json/value.hpp>
 
+#include <algorithm>
 #include <string>
 
 namespace json::detail {
@@ -40,7 +41,9 @@ class WriteVisitor : public boost::static_visitor<void> {
     void write_array(const Array& items) const;
     void write_object(const Object& members) const;
     /// The widened '\n', then a flush (exactly what std::endl does), then `indent` spaces.
-    void new_line(int indent) const;
+    void new_line(int indent) const {
+        buffer.new_line(static_cast<std::size_t>(std::max(indent, 0)));
+    }
     /// `count` spaces.
     void write_indent(int count) const;
 
