@@ -31,7 +31,7 @@ class WriteVisitor : public boost::static_visitor<void> {
     void operator()(const Object& members) const { write_object(members); }
     void operator()(float number) const { write_number(number); }
 
-    /// The quoted, escaped string; used for string values and object keys.
+    /// The quoted, escaped string of a string value.
     void write_string(const std::string& text) const;
     /// A member name as write_string writes it, and its colon.
     void write_member_name(const std::string& name) const;

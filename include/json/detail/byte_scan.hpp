@@ -39,7 +39,7 @@ inline int special_bytes_of_16(const char* from) noexcept {
 
 /// The first byte in [from, end) for which is_special_byte holds, or `end`. Linear; sixteen
 /// bytes at a time with SSE2 where the compiler targets it (every x86-64 processor, so no
-/// run-time dispatch) when the range has sixteen, eight at a time otherwise, then one by one. Reads
+/// run-time dispatch) and the range has sixteen, else eight at a time, then one by one. Reads
 /// nothing outside [from, end). Throws nothing.
 template <bool WithSlash>
 inline const char* find_special_byte(const char* from, const char* end) noexcept {
