@@ -15,15 +15,17 @@
 namespace json::detail {
 
 /// Whether `byte` needs attention inside a JSON string: a control character (below 0x20),
-/// '"' or '\\', and also '/' when `WithSlash` (the writer escapes it; the parser keeps it).
-template <bool WithSlash>
+/// '"' or '\\', also '/' when `WithSlash` (the writer escapes it; the parser keeps it), and
+/// also every byte from 0x80 up when `WithHigh` (where UTF-8 is checked or escaped).
+template <bool WithSlash, bool WithHigh = false>
 constexpr bool is_special_byte(unsigned char byte) {
-    return byte < 0x20 || byte == '"' || byte == '\\' || (WithSlash && byte == '/');
+    return byte < 0x20 || byte == '"' || byte == '\\' || (WithSlash && byte == '/') ||
+           (WithHigh && byte >= 0x80);
 }
 
 #if defined(__SSE2__)
 /// Bit i is set when byte i of the sixteen at `from` needs attention (see is_special_byte).
-template <bool WithSlash>
+template <bool WithSlash, bool WithHigh = false>
 inline int special_bytes_of_16(const char* from) noexcept {
     const __m128i bytes = _mm_loadu_si128(reinterpret_cast<const __m128i*>(from));
     // Unsigned min(byte, 0x1F) == byte exactly for the bytes below 0x20.
@@ -33,7 +35,9 @@ inline int special_bytes_of_16(const char* from) noexcept {
         _mm_or_si128(_mm_cmpeq_epi8(bytes, _mm_set1_epi8('"')),
                      _mm_or_si128(_mm_cmpeq_epi8(bytes, _mm_set1_epi8(WithSlash ? '/' : '"')),
                                   _mm_cmpeq_epi8(bytes, _mm_set1_epi8('\\'))));
-    return _mm_movemask_epi8(_mm_or_si128(control, special));
+    const int hits = _mm_movemask_epi8(_mm_or_si128(control, special));
+    // The sign bit of each byte is the byte's own high bit.
+    return WithHigh ? hits | _mm_movemask_epi8(bytes) : hits;
 }
 #endif
 
@@ -41,13 +45,13 @@ inline int special_bytes_of_16(const char* from) noexcept {
 /// bytes at a time with SSE2 where the compiler targets it (every x86-64 processor, so no
 /// run-time dispatch) and the range has sixteen, else eight at a time, then one by one. Reads
 /// nothing outside [from, end). Throws nothing.
-template <bool WithSlash>
+template <bool WithSlash, bool WithHigh = false>
 inline const char* find_special_byte(const char* from, const char* end) noexcept {
 #if defined(__SSE2__)
     if (end - from >= 16) {
         const char* const last_block = end - 16;
         while (from < last_block) {
-            const int hits = special_bytes_of_16<WithSlash>(from);
+            const int hits = special_bytes_of_16<WithSlash, WithHigh>(from);
             if (hits != 0) {
                 return from + __builtin_ctz(static_cast<unsigned>(hits));
             }
@@ -55,7 +59,7 @@ inline const char* find_special_byte(const char* from, const char* end) noexcept
         }
         // The last sixteen bytes of the range, instead of a byte loop over the rest: those
         // of them scanned already (fewer than sixteen) had nothing, so the first hit is new.
-        const int hits = special_bytes_of_16<WithSlash>(last_block);
+        const int hits = special_bytes_of_16<WithSlash, WithHigh>(last_block);
         return hits != 0 ? last_block + __builtin_ctz(static_cast<unsigned>(hits)) : end;
     }
 #endif
@@ -67,14 +71,16 @@ inline const char* find_special_byte(const char* from, const char* end) noexcept
     const auto has_special = [&](std::uint64_t word) {
         const std::uint64_t below_space = (word - ones * 0x20) & ~word & highs;
         const std::uint64_t slash = WithSlash ? has_zero_byte(word ^ (ones * '/')) : 0;
-        return (below_space | slash | has_zero_byte(word ^ (ones * '"')) |
+        const std::uint64_t high = WithHigh ? word & highs : 0;
+        return (below_space | slash | high | has_zero_byte(word ^ (ones * '"')) |
                 has_zero_byte(word ^ (ones * '\\'))) != 0;
     };
     std::uint64_t word = 0;
     while (end - from >= 8 && (std::memcpy(&word, from, 8), !has_special(word))) {
         from += 8;
     }
-    while (from != end && !is_special_byte<WithSlash>(static_cast<unsigned char>(*from))) {
+    while (from != end &&
+           !is_special_byte<WithSlash, WithHigh>(static_cast<unsigned char>(*from))) {
         ++from;
     }
     return from;
@@ -84,12 +90,12 @@ inline const char* find_special_byte(const char* from, const char* end) noexcept
 /// sixteen bytes are readable at `from` (as in any std::string whose capacity is at least 15:
 /// the bytes past its size are read but play no part). One comparison for a short string
 /// instead of a loop. Throws nothing.
-template <bool WithSlash>
+template <bool WithSlash, bool WithHigh = false>
 inline bool short_run_is_plain(const char* from, std::size_t count) noexcept {
 #if defined(__SSE2__)
-    return (special_bytes_of_16<WithSlash>(from) & ((1 << count) - 1)) == 0;
+    return (special_bytes_of_16<WithSlash, WithHigh>(from) & ((1 << count) - 1)) == 0;
 #else
-    return find_special_byte<WithSlash>(from, from + count) == from + count;
+    return find_special_byte<WithSlash, WithHigh>(from, from + count) == from + count;
 #endif
 }
 
