@@ -3,10 +3,12 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <cstdio>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <map>
+#include <random>
 #include <sstream>
 
 namespace {
@@ -30,9 +32,8 @@ TEST(Parser, Values) {
         {"4.9e-324", 5e-324},            // subnormals are in range
         {R"("\"\\\/\b\f\n\r\t")", "\"\\/\b\f\n\r\t"},
         {R"("\u0041\u00e9\u20AC\ud83d\ude00")", "A\xC3\xA9\xE2\x82\xAC\xF0\x9F\x98\x80"},
-        {R"("\ud83dx\ude00")", "\xEF\xBF\xBDx\xEF\xBF\xBD"}, // unpaired: U+FFFD
         {R"("a\u0000b")", std::string("a\0b", 3)},
-        {"\"caf\xC3\xA9 \xFF\"", "caf\xC3\xA9 \xFF"}, // bytes from 0x80 up are kept
+        {"\"caf\xC3\xA9 \xF0\x9F\x98\x80\"", "caf\xC3\xA9 \xF0\x9F\x98\x80"},
         {"[]", Array{}},
         {"{}", Object{}},
         {R"([1, "two", [true], {"k": null}])",
@@ -109,7 +110,7 @@ TEST(Parser, Failures) {
         Value out;
         const ParseReport report = parse(text, out, {});
         return std::to_string(report.line) + ":" + std::to_string(report.column) + " " +
-               report.message() + (report.too_deep ? " too deep" : "");
+               report.message() + (report.refusal == Refusal::TOO_DEEP ? " too deep" : "");
     };
     EXPECT_EQ(message("[\n  1,\n  2 3\n]"),
               "3:5 No trailing ']' while parsing value of type array (possible missing comma?)");
@@ -121,6 +122,305 @@ TEST(Parser, Failures) {
     Value out;
     EXPECT_EQ(parse(std::string(512, '[') + std::string(512, ']'), out), R::SUCCESS);
     EXPECT_TRUE(parse(std::string(513, '[') + std::string(513, ']'), out, ParseOptions{513}));
+}
+
+// Options from letters: c comments, t trailing commas, u invalid UTF-8, s lone surrogates,
+// d duplicates refused, x exact numbers.
+ParseOptions options_from(std::string_view letters) {
+    ParseOptions options;
+    options.allow_comments = letters.find('c') != std::string_view::npos;
+    options.allow_trailing_commas = letters.find('t') != std::string_view::npos;
+    options.allow_invalid_utf8 = letters.find('u') != std::string_view::npos;
+    options.allow_lone_surrogates = letters.find('s') != std::string_view::npos;
+    options.reject_duplicate_keys = letters.find('d') != std::string_view::npos;
+    options.exact_numbers = letters.find('x') != std::string_view::npos;
+    return options;
+}
+
+// "=" and the compact text of what `text` parses to, or "@offset #code" and the refusal;
+// checks that a failure leaves `out` alone.
+std::string outcome(std::string_view text, std::string_view letters) {
+    static constexpr const char* REFUSALS[] = {"",          "too deep",  "bad UTF-8",
+                                               "surrogate", "duplicate", "inexact"};
+    Value out = "untouched";
+    const ParseReport report = parse(text, out, options_from(letters));
+    if (report) {
+        return "=" + serialize(out);
+    }
+    EXPECT_EQ(out, Value("untouched")) << text;
+    std::string failure = "@" + std::to_string(report.offset) + " #" +
+                          std::to_string(static_cast<int>(report.result));
+    if (report.refusal != Refusal::NONE) {
+        failure.append(" ").append(REFUSALS[static_cast<int>(report.refusal)]);
+    }
+    return failure;
+}
+
+struct OptionRow {
+    std::string text;
+    std::string letters;
+    std::string expected;
+};
+
+void expect_outcomes(const std::vector<OptionRow>& rows) {
+    for (const auto& [text, letters, expected] : rows) {
+        EXPECT_EQ(outcome(text, letters), expected) << text << " with '" << letters << "'";
+    }
+}
+
+// Nothing is changed silently: each of these is refused by default or when asked, and parsed
+// as before by the lenient setting.
+TEST(ParseOptions, RefusedUnlessAllowed) {
+    expect_outcomes({
+        {R"({"id": 1234567890123456789})", "x", "@7 #13 inexact"},
+        {R"({"id": 1234567890123456789})", "", R"(={"id":1234567890123456768})"},
+        {"[1e400]", "x", "@1 #13 inexact"},
+        {"[1e400]", "", R"(=["Inf"])"},
+        {"[-1e-400]", "x", "@1 #13 inexact"},
+        {"[1e-400]", "", "=[0]"},
+        {"3.14159265358979323846", "x", "@0 #13 inexact"},
+        {"3.14159265358979323846", "", "=3.141592653589793"},
+        {"\"\xFF\xFE\"", "", "@1 #9 bad UTF-8"},
+        {"\"\xFF\xFE\"", "u", "=\"\xFF\xFE\""},
+        {R"("\ud800")", "", "@1 #6 surrogate"},
+        {R"("\ud800")", "s", "=\"\xEF\xBF\xBD\""},
+        {R"({"a":1,"a":2})", "", R"(={"a":2})"},
+        {R"({"a":1,"a":2})", "d", "@7 #17 duplicate"},
+        {"// settings\n[1]", "", "@0 #11"},
+        {"// settings\n[1]", "c", "=[1]"},
+        {"[1,]", "", "@3 #11"},
+        {"[1,]", "t", "=[1]"},
+        {R"({"a":1,})", "", "@7 #8"},
+        {R"({"a":1,})", "t", R"(={"a":1})"},
+    });
+    const std::tuple<std::string, std::string, std::string> notes[] = {
+        {"[1 // one\n]", "", "comments are not JSON; the allow_comments option accepts them"},
+        {"[1,]", "", "a trailing comma is not JSON; the allow_trailing_commas option accepts one"},
+        {"[1234567890123456789]", "x",
+         "1234567890123456789 cannot be held exactly by a double; without the exact_numbers "
+         "option it is rounded"},
+        {"[" + std::string(50, '1') + "]", "x", std::string(40, '1') + "... cannot be held"},
+        {R"(["x\udc00y"])", "", "\\udc00 is half of a surrogate pair without its other half"},
+        {"\"\xC0\x80\"", "", "not well-formed UTF-8"},
+        {R"({"a":1,"a":2})", "d", "already has a member of this name"},
+        {"[1 /* open", "c", "the comment is not closed"},
+        {"[1 / 2]", "c", "a comment starts with // or /*"},
+        {std::string(513, '['), "", "nested deeper than the maximum depth"}};
+    for (const auto& [text, letters, note] : notes) {
+        Value out;
+        const ParseReport report = parse(text, out, options_from(letters));
+        EXPECT_NE(report.note.find(note), std::string::npos) << text << ": " << report.note;
+    }
+}
+
+// Comments and trailing commas, alone and together, where they may stand and where not.
+TEST(ParseOptions, CommentsAndTrailingCommas) {
+    expect_outcomes({
+        {"/* head */ [1, /* between */ 2] // tail", "c", "=[1,2]"},
+        {"[1//c\n,2//c\r,3]", "c", "=[1,2,3]"},
+        {"{/**/\"a\"/**/:/**/1/**/}", "c", R"(={"a":1})"},
+        {"/**/", "c", "@4 #3"},
+        {"1 /* open", "c", "@2 #19"},
+        {"[1 /* open", "c", "@3 #15"},
+        {"/", "c", "@0 #11"},
+        {"[1]/", "c", "@3 #19"},
+        {"[1 /* a */ 2]", "c", "@11 #15"},
+        {"[\"//\", \"/*\"]", "", R"(=["\/\/","\/*"])"},
+        {"[1,/**/]", "ct", "=[1]"},
+        {"[1,/**/]", "t", "@3 #11"},
+        {"[1,/**/]", "c", "@7 #11"},
+        {"{\"a\":[1,],}", "t", R"(={"a":[1]})"},
+        {"[ 1 , ]", "t", "=[1]"},
+        {"[,]", "t", "@1 #11"},
+        {"{,}", "t", "@1 #8"},
+        {"[1,,]", "t", "@3 #11"},
+        {"[1,]", "cusdx", "@3 #11"},
+        {"[1,]", "cusdxt", "=[1]"},
+    });
+}
+
+// Every boundary of the table of well-formed UTF-8 sequences, in a short string, in one long
+// enough for the sixteen-byte scan and in a member name; refused at the first byte of the
+// ill-formed sequence, kept byte for byte with allow_invalid_utf8.
+TEST(ParseOptions, Utf8Boundaries) {
+    const std::pair<std::string, bool> sequences[] = {
+        {"\x7F", true},
+        {"\xC2\x80", true},
+        {"\xDF\xBF", true},
+        {"\xC1\xBF", false}, // overlong
+        {"\xC0\x80", false},
+        {"\xC2\x7F", false}, // cut short by an ASCII byte
+        {"\xC2\xC0", false},
+        {"\x80", false}, // a lone continuation byte
+        {"\xBF", false},
+        {"\xE0\xA0\x80", true},
+        {"\xE0\x9F\xBF", false}, // overlong
+        {"\xE0\xBF\xBF", true},
+        {"\xE1\x80\x80", true},
+        {"\xEC\xBF\xBF", true},
+        {"\xED\x80\x80", true},
+        {"\xED\x9F\xBF", true},
+        {"\xED\xA0\x80", false}, // a surrogate
+        {"\xED\xBF\xBF", false},
+        {"\xEE\x80\x80", true},
+        {"\xEF\xBF\xBF", true},
+        {"\xEF\xBF", false}, // cut short by the closing quote
+        {"\xF0\x90\x80\x80", true},
+        {"\xF0\x8F\xBF\xBF", false}, // overlong
+        {"\xF1\x80\x80\x80", true},
+        {"\xF3\xBF\xBF\xBF", true},
+        {"\xF4\x80\x80\x80", true},
+        {"\xF4\x8F\xBF\xBF", true},  // U+10FFFF
+        {"\xF4\x90\x80\x80", false}, // above U+10FFFF
+        {"\xF5\x80\x80\x80", false},
+        {"\xFF", false},
+        {"\xF0\x90\x80", false}};
+    for (const auto& [bytes, well_formed] : sequences) {
+        for (const std::string& before : {std::string("ab"), std::string(20, 'a')}) {
+            for (const bool as_name : {false, true}) {
+                const std::string string = "\"" + before + bytes + "z\"";
+                const std::string text = as_name ? "{" + string + ":1}" : string;
+                const std::size_t offset = (as_name ? 2 : 1) + before.size();
+                const std::string stored = as_name ? "={" + string + ":1}" : "=" + string;
+                EXPECT_EQ(outcome(text, ""),
+                          well_formed ? stored : "@" + std::to_string(offset) + " #9 bad UTF-8")
+                    << string;
+                EXPECT_EQ(outcome(text, "u"), stored) << string;
+            }
+        }
+    }
+    EXPECT_EQ(outcome("\"\xE2\x82", ""), "@1 #9 bad UTF-8"); // cut short by the end of the text
+}
+
+// Surrogate escapes: pairs in either run of escapes, every way of leaving one unpaired.
+TEST(ParseOptions, LoneSurrogates) {
+    expect_outcomes({
+        {R"("x\ud83d\ude00")", "", "=\"x\xF0\x9F\x98\x80\""},
+        {R"("\udbff\udfff")", "", "=\"\xF4\x8F\xBF\xBF\""},
+        {R"("\ud83dx")", "", "@1 #6 surrogate"},
+        {R"("\ude00\ud83d")", "", "@1 #6 surrogate"},
+        {R"("\ud83d\ud83d\ude00")", "", "@1 #6 surrogate"},
+        {R"("ab\u0041\udbff")", "", "@9 #6 surrogate"},
+        {R"("\ud83d\n\ude00")", "", "@1 #6 surrogate"},
+        {R"({"\udfff":1})", "", "@2 #6 surrogate"},
+        {R"("\ud83dx\ude00")", "s", "=\"\xEF\xBF\xBDx\xEF\xBF\xBD\""},
+    });
+}
+
+// The last member of a name wins, or the second of them is refused.
+TEST(ParseOptions, DuplicateKeys) {
+    expect_outcomes({
+        {R"({"a":1,"b":2,"a":3,"a":4})", "", R"(={"a":4,"b":2})"},
+        {R"({"a":1,"b":2,"a":3,"a":4})", "d", "@13 #17 duplicate"},
+        {R"({"b":1,"a":1,"b":2,"a":2})", "d", "@13 #17 duplicate"},
+        {R"({"same prefix 1":1,"same prefix 2":2})", "d",
+         R"(={"same prefix 1":1,"same prefix 2":2})"},
+        {R"([{"a":1},{"a":2}])", "d", R"(=[{"a":1},{"a":2}])"},
+        {R"({"a":{"a":1}})", "d", R"(={"a":{"a":1}})"},
+        {R"({"o":{"x":1, "x":2}})", "d", "@13 #17 duplicate"},
+        {R"({"a":1,"a":2,})", "dt", "@7 #17 duplicate"},
+        {"{\"\\u0061\":1,\"a\":2}", "d", "@12 #17 duplicate"},
+    });
+}
+
+// The exact-number rule at its edges: 2^53, digit counts, subnormals, overflow, zeros, trailing
+// zeros and exponents.
+TEST(ParseOptions, ExactNumbers) {
+    const std::pair<std::string, bool> rows[] = {
+        {"9007199254740992", true}, // 2^53
+        {"9007199254740993", false},
+        {"9007199254740994", true},
+        {"-9007199254740993", false},
+        {"123456789012345", true},
+        {"0.123456789012345", true},
+        {"0.1234567890123456", true},
+        {"0.12345678901234567", false},
+        {"0.12345678901234566", true},
+        {"123456789012345.6", true},
+        {"1234567890123456.7", false},
+        {"0.1", true},
+        {"0.10000000000000001", false},
+        {"1.50", true},
+        {"1.500000000000000000000000", true},
+        {"100e-2", true},
+        {"1E2", true},
+        {"1e+2", true},
+        {"1e22", true},
+        {"1e23", true},
+        {"12345678901234500000", false},
+        {"12345678901234499584", true},
+        {"-0", true},
+        {"-0.0e5", true},
+        {"0e-999999999999", true},
+        {"2.2250738585072014e-308", true},
+        {"2.2250738585072011e-308", false},
+        {"2.225073858507201e-308", true},
+        {"5e-324", true},
+        {"4.9e-324", false},
+        {"1e-400", false},
+        {"1.7976931348623157e308", true},
+        {"1.7976931348623158e308", false},
+        {"1e400", false},
+        {"-65.61361699999998", true},   // a coordinate as the writer writes it
+        {"-65.613616999999977", false}, // and as another writer wrote it
+        {"0.0078125", true},
+        {"0.00390625000000000001", false},
+    };
+    for (const auto& [literal, exact] : rows) {
+        EXPECT_EQ(outcome(literal, "x"), exact ? outcome(literal, "") : "@0 #13 inexact")
+            << literal;
+    }
+}
+
+// A number's text as its sign, its significant digits and the power of ten of the first one:
+// two texts denote the same decimal number exactly when these are equal (zero: no digits).
+std::string decimal_value(const std::string& text) {
+    const std::size_t mark = std::min(text.find_first_of("eE"), text.size());
+    std::string digits;
+    long exponent = mark < text.size() ? std::stol(text.substr(mark + 1)) : 0;
+    const std::size_t point = std::min(text.find('.'), mark);
+    for (std::size_t at = 0; at < mark; ++at) {
+        if (std::isdigit(static_cast<unsigned char>(text[at])) != 0 &&
+            (!digits.empty() || text[at] != '0')) {
+            if (digits.empty()) {
+                exponent += static_cast<long>(point) - static_cast<long>(at) - (at < point ? 1 : 0);
+            }
+            digits += text[at];
+        }
+    }
+    digits.erase(digits.find_last_not_of('0') + 1);
+    if (digits.empty()) {
+        return "0";
+    }
+    return (text[0] == '-' ? "-" : "") + digits + "e" + std::to_string(exponent);
+}
+
+// The rule itself on many numbers of ordinary size, written with 15 to 17 digits and with the
+// last digit moved: accepted exactly when the writer's text has the same decimal value.
+TEST(ParseOptions, ExactNumbersAgreeWithTheWriter) {
+    std::mt19937_64 random(2026);
+    std::uniform_real_distribution<double> mantissa(-1.0, 1.0);
+    std::uniform_int_distribution<int> scale(-12, 17);
+    int refused = 0;
+    for (int round = 0; round < 20000; ++round) {
+        const double number = mantissa(random) * std::pow(10.0, scale(random));
+        char text[40];
+        std::snprintf(text, sizeof text, "%.*g", 15 + round % 3, number);
+        std::string literal = text;
+        if (round % 5 == 0 && literal.find('e') == std::string::npos) {
+            char& last = literal.back();
+            last = last == '9' ? '8' : static_cast<char>(last + 1);
+        }
+        Value lenient;
+        ASSERT_EQ(parse(literal, lenient), R::SUCCESS) << literal;
+        const bool exact = decimal_value(serialize(lenient)) == decimal_value(literal);
+        Value strict;
+        EXPECT_EQ(parse(literal, strict, options_from("x")).result == R::SUCCESS, exact)
+            << literal << " is written " << serialize(lenient);
+        refused += exact ? 0 : 1;
+    }
+    EXPECT_GT(refused, 1000); // both outcomes were tried
+    EXPECT_LT(refused, 19000);
 }
 
 #ifdef JSON_DATA_DIR

@@ -49,6 +49,12 @@ namespace detail {
 /// it. Reports no failure of its own.
 JSONVALUE_API double string_to_double(const char* text);
 
+/// Whether the writer writes `value`, the double read from the JSON number `literal`, back as
+/// text that denotes the same decimal number (`1.50` and `1.5`, `1E2` and `100`, `-0` and `0`
+/// do). Constant time for literals of up to nineteen significant digits between 2^-8 and 2^53;
+/// other numbers are written out and compared digit by digit. Throws nothing.
+JSONVALUE_API bool is_written_back_exactly(std::string_view literal, double value) noexcept;
+
 /// The UTF-8 text of the `count` UTF-16 code units at `text` (no terminator needed; a 0 unit
 /// is converted like any other), converted by the text-encoding library. An unpaired
 /// surrogate becomes U+FFFD. Throws std::logic_error ("basic_string::_M_construct null not
@@ -58,21 +64,64 @@ JSONVALUE_API std::string u16_to_u8(char16_t* text, int count);
 
 } // namespace detail
 
-/// Limits for json::parse.
+/// What json::parse accepts beyond strict JSON, and what it refuses although the text is JSON.
+/// Every flag is off by default: strict RFC 8259, with nothing changed silently that the
+/// parser can tell (bad UTF-8 and unpaired surrogates are refused), except that a repeated
+/// member name keeps the last member (as every common parser does) and numbers are rounded
+/// to double as JSON parsers do. An aggregate: C++20 callers can write
+/// `{.allow_comments = true}`.
 struct ParseOptions {
     /// Arrays and objects nested deeper than this are refused.
     std::size_t max_depth = 512;
+    /// `//` comments to the end of the line and `/* ... */` comments wherever whitespace may
+    /// stand. An unclosed `/*` or a lone `/` stays an error.
+    bool allow_comments = false;
+    /// One comma before `]` or `}`. `[,]`, `{,}` and `[1,,]` stay errors.
+    bool allow_trailing_commas = false;
+    /// Keep strings and member names that are not well-formed UTF-8 byte for byte. Off:
+    /// overlong forms, encoded surrogates, code points above U+10FFFF, stray continuation
+    /// bytes and sequences cut short are refused.
+    bool allow_invalid_utf8 = false;
+    /// Turn a \u escape of an unpaired surrogate (U+D800 to U+DFFF) into U+FFFD. Off: refused.
+    bool allow_lone_surrogates = false;
+    /// Refuse an object that names a member twice. Off: the last member of that name wins.
+    bool reject_duplicate_keys = false;
+    /// Refuse a number unless the double it becomes is written back by this library as the
+    /// same decimal number (`1.50`, `1E2`, `-0`, `0.1` pass; `1e400`, `1e-400`,
+    /// `9007199254740993`, `0.10000000000000001` are refused). Costs nothing extra for numbers
+    /// of at most 15 significant digits between 2.2250738585072014e-308 and 2^53.
+    bool exact_numbers = false;
+};
+
+/// Why a text that is JSON (or that the options admit) was refused all the same.
+enum class Refusal {
+    NONE,           ///< not refused: parsed, or failed on the grammar
+    TOO_DEEP,       ///< nested deeper than ParseOptions::max_depth
+    INVALID_UTF8,   ///< a string or member name that is not well-formed UTF-8
+    LONE_SURROGATE, ///< a \u escape of a surrogate without its other half
+    DUPLICATE_KEY,  ///< a member name given twice, with reject_duplicate_keys
+    INEXACT_NUMBER, ///< a number a double cannot hold exactly, with exact_numbers
 };
 
 /// The detailed outcome of json::parse: the code, and for a failure where it happened and,
 /// when the code alone says too little, a plain note on why.
+///
+/// A refusal is reported with the closest of the twenty codes, always the same one:
+/// TOO_DEEP with MISSING_TRAILING_BRACKET or MISSING_TRAILING_BRACE (the container that could
+/// not be opened), INVALID_UTF8 with MISSING_TRAILING_QUOTE (as a raw control character in a
+/// string is: a byte that cannot stand there), LONE_SURROGATE with INVALID_UNICODE_ESCAPE,
+/// DUPLICATE_KEY with MISSING_TRAILING_BRACE (the object cannot be completed as written) and
+/// INEXACT_NUMBER with INVALID_EXPONENT (the number's magnitude or precision is beyond a
+/// double's). The position is that of the first byte of the ill-formed UTF-8 sequence, the
+/// backslash of the unpaired escape, the opening quote of the second member name, or the first
+/// character of the number.
 struct ParseReport {
     ParseResult result = ParseResult::SUCCESS; ///< the outcome
     std::size_t offset = 0;                    ///< byte offset of the failure in the text
     std::size_t line = 0;                      ///< 1-based line of the failure (0 on success)
     std::size_t column = 0;                    ///< 1-based column, counted in bytes (0 on success)
-    const char* note = nullptr; ///< e.g. "the document is nested deeper than the maximum depth"
-    bool too_deep = false;      ///< nesting beyond ParseOptions::max_depth was refused
+    std::string note; ///< e.g. "the document is nested deeper than the maximum depth"
+    Refusal refusal = Refusal::NONE; ///< set when valid text was refused, see above
 
     /// Whether the text parsed.
     explicit operator bool() const { return result == ParseResult::SUCCESS; }
@@ -80,7 +129,7 @@ struct ParseReport {
     /// The code's description, followed by the note when there is one.
     std::string message() const {
         std::string text = get_parse_result_description(result);
-        if (note != nullptr) {
+        if (!note.empty()) {
             text.append(" (").append(note).append(")");
         }
         return text;
@@ -107,18 +156,24 @@ inline void locate(ParseReport& report, std::string_view text, std::size_t offse
 namespace json {
 
 /// Parses exactly one JSON text (RFC 8259): one value of any kind, with only whitespace
-/// around it. On success stores the document in `out`. On failure `out` is left exactly as it
-/// was and the report says where and why. Iterative, linear in the length of the text.
+/// around it (and comments, when `options` allow them). On success stores the document in
+/// `out`. On failure or refusal `out` is left exactly as it was and the report says where and
+/// why. Iterative, linear in the length of the text (duplicate member names are looked for
+/// in O(n log n) of an object's n members, when the object closes).
 ///
 /// - Numbers become double (alternative 3); a number beyond the range of double becomes plus
-///   or minus infinity, one below it plus or minus zero.
+///   or minus infinity, one below it plus or minus zero, and digits beyond a double's
+///   precision are rounded: ParseOptions::exact_numbers refuses all three instead.
 /// - A run of \u escapes is converted as UTF-16, so a surrogate pair becomes one character;
-///   an unpaired surrogate becomes U+FFFD. Bytes from 0x80 up are kept unchanged (no UTF-8
-///   validation), as the writer writes them. Raw control characters in strings are refused.
-/// - When an object has a member name twice, the last member wins.
-/// - Nesting deeper than options.max_depth is refused with MISSING_TRAILING_BRACKET or
-///   MISSING_TRAILING_BRACE and `too_deep` set.
+///   an unpaired surrogate is refused (or becomes U+FFFD with allow_lone_surrogates). Strings
+///   and member names must be well-formed UTF-8 (or are kept byte for byte with
+///   allow_invalid_utf8). Raw control characters in strings are refused.
+/// - When an object has a member name twice, the last member wins (or, with
+///   reject_duplicate_keys, the object is refused once it closes, at the second name).
+/// - A comment or a trailing comma met while the options do not allow it fails as the
+///   grammar says, with a note that names the option.
 /// - Text after the value is refused with UNEXPECTED_END_OF_INPUT and a note saying so.
+/// - Refusals of valid text set ParseReport::refusal; see ParseReport for their codes.
 ///
 /// Throws std::bad_alloc. When one allocation fails, `out` is left as it was. Handing the
 /// document over costs one allocation when `out` must change to an Array or Object from
@@ -126,12 +181,12 @@ namespace json {
 /// if memory stays exhausted for both does `out` end up holding `false`, its old content
 /// released (never any part of the new document).
 inline ParseReport parse(std::string_view text, Value& out, const ParseOptions& options) {
-    detail::Parser parser(text, options.max_depth);
+    detail::Parser parser(text, options);
     ParseReport report;
     report.result = parser.run(out);
     if (report.result != ParseResult::SUCCESS) {
-        report.note = parser.note();
-        report.too_deep = parser.nesting_too_deep();
+        report.refusal = parser.refusal();
+        report.note = parser.take_note();
         detail::locate(report, text, parser.failure_offset());
     }
     return report;

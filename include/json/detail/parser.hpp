@@ -6,9 +6,12 @@
 // only through the Value model and the two exported conversions.
 
 #include <json/detail/byte_scan.hpp>
+#include <json/detail/utf8.hpp>
 #include <json/value.hpp>
 
 #include <algorithm>
+#include <cfloat>
+#include <cmath>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
@@ -25,9 +28,9 @@ namespace detail {
 /// document may have is limited by ParseOptions::max_depth alone, never by the call stack.
 class Parser {
   public:
-    Parser(std::string_view text, std::size_t max_depth)
+    Parser(std::string_view text, const ParseOptions& options)
         : begin(text.data()), cursor(text.data()), end(text.data() + text.size()),
-          max_depth(max_depth) {}
+          options(options) {}
 
     /// Parses the whole text and hands the document to `out`; on failure leaves `out` as it
     /// was and records where and why.
@@ -35,8 +38,8 @@ class Parser {
 
     /// Where parsing stopped, why, and extra wording when the code alone says too little.
     std::size_t failure_offset() const { return static_cast<std::size_t>(cursor - begin); }
-    const char* note() const { return failure_note; }
-    bool nesting_too_deep() const { return too_deep; }
+    std::string take_note() { return std::move(failure_note); }
+    Refusal refusal() const { return refused; }
 
   private:
     struct OpenContainer {
@@ -68,38 +71,53 @@ class Parser {
     ParseResult parse_escape(std::string& text);
     ParseResult parse_unicode_escapes(std::string& text);
     ParseResult parse_number();
+    static bool held_exactly(std::string_view literal, std::ptrdiff_t digits, double value);
+    ParseResult refuse_inexact(std::string_view literal);
     ParseResult parse_literal(std::string_view literal, ParseResult mismatch);
     ParseResult parse_member_name();
+    ParseResult after_comma(bool in_object, bool& closed);
     ParseResult open(bool is_object);
-    void close();
+    ParseResult close();
+    ParseResult refuse_repeated_name(std::size_t first_name);
     template <typename Container, typename Marker>
     void finish(Container& content, std::vector<Container>& finished, Marker marker);
     template <typename Alternative>
     Value& push_value(Alternative&& value);
     void grow_values();
-    ParseResult fail(ParseResult result, const char* note = nullptr) {
-        failure_note = note;
-        return result;
+    ParseResult fail(ParseResult result, std::string_view note = {});
+    ParseResult refuse(Refusal why, ParseResult result, std::string_view note) {
+        refused = why;
+        return fail(result, note);
     }
     void skip_whitespace() {
         // Most tokens follow the previous one directly: no scan is set up for them.
         if (cursor != end && is_whitespace(*cursor)) {
             cursor = detail::skip_whitespace(cursor + 1, end);
         }
+        if (options.allow_comments && at('/')) {
+            skip_comments();
+        }
+    }
+    void skip_comments();
+    const char* find_string_stop(const char* from) const {
+        return options.allow_invalid_utf8 ? find_special_byte<false>(from, end)
+                                          : find_special_or_ill_formed<false>(from, end);
     }
     bool at(char c) const { return cursor != end && *cursor == c; }
 
     const char* const begin;
     const char* cursor;
     const char* const end;
-    const std::size_t max_depth;
-    const char* failure_note = nullptr;
-    bool too_deep = false;
+    const ParseOptions options;
+    std::string failure_note;
+    Refusal refused = Refusal::NONE;
 
     std::vector<Value> values; // finished values whose container is still open
     std::vector<Array> finished_arrays;
     std::vector<Object> finished_objects;
     std::vector<std::string> names; // member names of the open objects, in document order
+    std::vector<std::size_t>
+        name_offsets; // where each of `names` starts, with reject_duplicate_keys
     std::vector<OpenContainer> open_containers;
     std::vector<MemberInKeyOrder> members_in_key_order; // reused by every object closed
     std::string number_text;     // reused buffer for the NUL-terminated number text
@@ -139,17 +157,17 @@ inline ParseResult Parser::run(Value& out) {
         }
         if (*cursor == ',') {
             ++cursor;
-            expect_value = true;
-            if (in_object) {
-                skip_whitespace();
-                if (const ParseResult result = parse_member_name();
-                    result != ParseResult::SUCCESS) {
-                    return result;
-                }
+            bool closed = false;
+            if (const ParseResult result = after_comma(in_object, closed);
+                result != ParseResult::SUCCESS) {
+                return result;
             }
+            expect_value = !closed;
         } else if (*cursor == (in_object ? '}' : ']')) {
             ++cursor;
-            close();
+            if (const ParseResult result = close(); result != ParseResult::SUCCESS) {
+                return result;
+            }
             expect_value = false;
         } else {
             return fail(in_object ? ParseResult::MISSING_TRAILING_BRACE
@@ -173,8 +191,7 @@ inline ParseResult Parser::parse_value(bool& completed) {
         skip_whitespace();
         if (at(is_object ? '}' : ']')) {
             ++cursor;
-            close();
-            return ParseResult::SUCCESS;
+            return close();
         }
         completed = false;
         return is_object ? parse_member_name() : ParseResult::SUCCESS;
@@ -197,12 +214,34 @@ inline ParseResult Parser::parse_value(bool& completed) {
     }
 }
 
+// After the comma between two elements or members: the next member's name, or (where the
+// options allow a trailing comma) the end of the container.
+inline ParseResult Parser::after_comma(bool in_object, bool& closed) {
+    skip_whitespace();
+    if (at(in_object ? '}' : ']')) {
+        if (!options.allow_trailing_commas) {
+            // The code is the one the grammar gives for what stands there instead of a value.
+            return fail(in_object ? ParseResult::MISSING_LEADING_QUOTE
+                                  : ParseResult::MISSING_LEADING_DIGIT,
+                        "a trailing comma is not JSON; the allow_trailing_commas option accepts "
+                        "one");
+        }
+        ++cursor;
+        closed = true;
+        return close();
+    }
+    return in_object ? parse_member_name() : ParseResult::SUCCESS;
+}
+
 inline ParseResult Parser::parse_member_name() {
     if (cursor == end) {
         return fail(ParseResult::UNEXPECTED_END_OF_INPUT);
     }
     if (*cursor != '"') {
         return fail(ParseResult::MISSING_LEADING_QUOTE, "a member name must be a string");
+    }
+    if (options.reject_duplicate_keys) {
+        name_offsets.push_back(static_cast<std::size_t>(cursor - begin));
     }
     if (const std::optional<std::string_view> plain = plain_string()) {
         names.emplace_back(*plain);
@@ -226,7 +265,7 @@ inline ParseResult Parser::parse_member_name() {
 // is then built in one piece. Otherwise nothing, and the cursor stays on the opening quote.
 inline std::optional<std::string_view> Parser::plain_string() {
     const char* const first = cursor + 1;
-    const char* const stop = find_special_byte<false>(first, end);
+    const char* const stop = find_string_stop(first);
     if (stop == end || *stop != '"') {
         return std::nullopt;
     }
@@ -237,10 +276,9 @@ inline std::optional<std::string_view> Parser::plain_string() {
 inline ParseResult Parser::parse_string(std::string& text) {
     ++cursor; // the opening quote
     for (;;) {
-        // Bytes that need no attention are copied in one piece; bytes from 0x80 up are kept
-        // as they are.
+        // Bytes that need no attention, well-formed UTF-8 included, are copied in one piece.
         const char* const run = cursor;
-        cursor = find_special_byte<false>(cursor, end);
+        cursor = find_string_stop(cursor);
         text.append(run, cursor);
         if (cursor == end) {
             return fail(ParseResult::MISSING_TRAILING_QUOTE, "the string is not closed");
@@ -248,6 +286,11 @@ inline ParseResult Parser::parse_string(std::string& text) {
         if (*cursor == '"') {
             ++cursor;
             return ParseResult::SUCCESS;
+        }
+        if (static_cast<unsigned char>(*cursor) >= 0x80) {
+            return refuse(Refusal::INVALID_UTF8, ParseResult::MISSING_TRAILING_QUOTE,
+                          "the bytes from here on are not well-formed UTF-8; the "
+                          "allow_invalid_utf8 option keeps them as they are");
         }
         if (*cursor != '\\') {
             return fail(ParseResult::MISSING_TRAILING_QUOTE,
@@ -281,6 +324,7 @@ inline ParseResult Parser::parse_escape(std::string& text) {
 // A run of \u escapes is converted at once, so that a surrogate pair split over two escapes
 // becomes one character. The cursor is on the 'u' of the first escape.
 inline ParseResult Parser::parse_unicode_escapes(std::string& text) {
+    const char* const first_escape = cursor - 1; // its backslash
     utf16.clear();
     for (;;) {
         ++cursor; // the 'u'
@@ -304,6 +348,22 @@ inline ParseResult Parser::parse_unicode_escapes(std::string& text) {
             break;
         }
         ++cursor; // the backslash of the next escape
+    }
+    if (!options.allow_lone_surrogates) {
+        const auto is_high = [](char16_t unit) { return unit >= 0xD800 && unit <= 0xDBFF; };
+        const auto is_low = [](char16_t unit) { return unit >= 0xDC00 && unit <= 0xDFFF; };
+        for (std::size_t at = 0; at < utf16.size(); ++at) {
+            if (is_high(utf16[at]) && at + 1 < utf16.size() && is_low(utf16[at + 1])) {
+                ++at; // a pair
+            } else if (is_high(utf16[at]) || is_low(utf16[at])) {
+                constexpr std::size_t escape_length = 6; // every escape of the run is \uXXXX
+                cursor = first_escape + at * escape_length;
+                return refuse(Refusal::LONE_SURROGATE, ParseResult::INVALID_UNICODE_ESCAPE,
+                              std::string(cursor, escape_length) +
+                                  " is half of a surrogate pair without its other half; the "
+                                  "allow_lone_surrogates option makes it U+FFFD");
+            }
+        }
     }
     text += u16_to_u8(utf16.data(), static_cast<int>(utf16.size()));
     return ParseResult::SUCCESS;
@@ -329,7 +389,7 @@ inline ParseResult Parser::parse_number() {
     const auto digit_here = [&here, this] { return here != end && *here >= '0' && *here <= '9'; };
     const auto skip_digits = [&] { here = detail::skip_digits(here, end); };
     const auto here_is = [&here, this](char c) { return here != end && *here == c; };
-    const auto fail_here = [&](ParseResult result, const char* note = nullptr) {
+    const auto fail_here = [&](ParseResult result, std::string_view note = {}) {
         cursor = here;
         return fail(result, note);
     };
@@ -342,17 +402,24 @@ inline ParseResult Parser::parse_number() {
     if (!digit_here()) {
         return fail_here(ParseResult::MISSING_LEADING_DIGIT, "no JSON value starts here");
     }
+    // Digits of the integer and fraction parts, leading zeros aside but for the fraction's:
+    // an upper bound on the significant digits, which is all exact_numbers needs.
+    std::ptrdiff_t digits = 0;
     if (*here == '0') {
         ++here; // no further digits after a leading zero
     } else {
+        const char* const first_digit = here;
         skip_digits();
+        digits = here - first_digit;
     }
     if (here_is('.')) {
         ++here;
         if (!digit_here()) {
             return fail_here(ParseResult::INVALID_FRACTION);
         }
+        const char* const first_digit = here;
         skip_digits();
+        digits += here - first_digit;
     }
     if (here_is('e') || here_is('E')) {
         ++here;
@@ -364,19 +431,48 @@ inline ParseResult Parser::parse_number() {
         }
         skip_digits();
     }
-    cursor = here;
-    const auto length = static_cast<std::size_t>(cursor - start);
+    const auto length = static_cast<std::size_t>(here - start);
+    double value = 0;
     if (length < short_number) {
         if (!copy_ahead || length >= copied_ahead) {
             std::memcpy(text, start, length);
         }
         text[length] = '\0';
-        push_value(string_to_double(text));
+        value = string_to_double(text);
     } else {
-        number_text.assign(start, cursor);
-        push_value(string_to_double(number_text.c_str()));
+        number_text.assign(start, here);
+        value = string_to_double(number_text.c_str());
     }
+    if (options.exact_numbers && !held_exactly(std::string_view(start, length), digits, value)) {
+        cursor = start;
+        return refuse_inexact(std::string_view(start, length));
+    }
+    cursor = here;
+    push_value(value);
     return ParseResult::SUCCESS;
+}
+
+// Up to fifteen significant digits come back unchanged from a normal double (DBL_DIG), and the
+// writer writes every double below 2^53 with its shortest digits; anything else is checked
+// against the text the writer would give.
+inline bool Parser::held_exactly(std::string_view literal, std::ptrdiff_t digits, double value) {
+    constexpr double exact_integers = 9007199254740992.0; // 2^53
+    const double magnitude = std::fabs(value);
+    if (digits <= DBL_DIG && magnitude >= DBL_MIN && magnitude <= exact_integers) {
+        return true;
+    }
+    return is_written_back_exactly(literal, value);
+}
+
+inline ParseResult Parser::refuse_inexact(std::string_view literal) {
+    constexpr std::size_t shown = 40;
+    std::string note(literal.substr(0, shown));
+    if (literal.size() > shown) {
+        note += "...";
+    }
+    note += " cannot be held exactly by a double; without the exact_numbers option it is "
+            "rounded";
+    return refuse(Refusal::INEXACT_NUMBER, ParseResult::INVALID_EXPONENT, note);
 }
 
 inline ParseResult Parser::parse_literal(std::string_view literal, ParseResult mismatch) {
@@ -394,11 +490,11 @@ inline ParseResult Parser::parse_literal(std::string_view literal, ParseResult m
 }
 
 inline ParseResult Parser::open(bool is_object) {
-    if (open_containers.size() >= max_depth) {
-        too_deep = true;
-        return fail(is_object ? ParseResult::MISSING_TRAILING_BRACE
-                              : ParseResult::MISSING_TRAILING_BRACKET,
-                    "the document is nested deeper than the maximum depth");
+    if (open_containers.size() >= options.max_depth) {
+        return refuse(Refusal::TOO_DEEP,
+                      is_object ? ParseResult::MISSING_TRAILING_BRACE
+                                : ParseResult::MISSING_TRAILING_BRACKET,
+                      "the document is nested deeper than the maximum depth");
     }
     ++cursor;
     open_containers.push_back(
@@ -426,7 +522,7 @@ inline std::uint64_t name_prefix(const std::string& name) {
 
 // Builds the innermost open container at its final size from the values parsed for it,
 // adopting each one without a copy, and leaves it as one finished value.
-inline void Parser::close() {
+inline ParseResult Parser::close() {
     const OpenContainer container = open_containers.back();
     open_containers.pop_back();
     // The finished containers of the children, in document order.
@@ -506,6 +602,13 @@ inline void Parser::close() {
         if (!std::is_sorted(members_in_key_order.begin(), members_in_key_order.end(), key_order)) {
             std::sort(members_in_key_order.begin(), members_in_key_order.end(), key_order);
         }
+        if (options.reject_duplicate_keys) {
+            if (const ParseResult result = refuse_repeated_name(container.first_name);
+                result != ParseResult::SUCCESS) {
+                return result;
+            }
+            name_offsets.resize(container.first_name);
+        }
         Object members;
         for (const MemberInKeyOrder& member : members_in_key_order) {
             std::string& name = names_of[static_cast<std::ptrdiff_t>(member.child)];
@@ -523,15 +626,72 @@ inline void Parser::close() {
         names.resize(container.first_name);
         release_children();
         finish(members, finished_objects, 0.0F); // OBJECT_MARKER
-    } else {
-        Array items;
-        items.reserve(values.size() - container.first_value);
-        for (auto child = children; child != values.end(); ++child) {
-            adopt(*child, slot_of(*child),
-                  [&items](const auto& initial) -> Value& { return items.emplace_back(initial); });
+        return ParseResult::SUCCESS;
+    }
+    Array items;
+    items.reserve(values.size() - container.first_value);
+    for (auto child = children; child != values.end(); ++child) {
+        adopt(*child, slot_of(*child),
+              [&items](const auto& initial) -> Value& { return items.emplace_back(initial); });
+    }
+    release_children();
+    finish(items, finished_arrays, Undefined()); // ARRAY_MARKER
+    return ParseResult::SUCCESS;
+}
+
+// With the members of the object being closed in key order (equal names in document order),
+// refuses the object at the earliest member whose name an earlier member had.
+inline ParseResult Parser::refuse_repeated_name(std::size_t first_name) {
+    std::size_t earliest_repeat = SIZE_MAX;
+    for (std::size_t at = 1; at < members_in_key_order.size(); ++at) {
+        const MemberInKeyOrder& previous = members_in_key_order[at - 1];
+        const MemberInKeyOrder& member = members_in_key_order[at];
+        if (member.name_prefix == previous.name_prefix &&
+            names[first_name + member.child] == names[first_name + previous.child]) {
+            earliest_repeat = std::min(earliest_repeat, member.child);
         }
-        release_children();
-        finish(items, finished_arrays, Undefined()); // ARRAY_MARKER
+    }
+    if (earliest_repeat == SIZE_MAX) {
+        return ParseResult::SUCCESS;
+    }
+    cursor = begin + name_offsets[first_name + earliest_repeat];
+    return refuse(Refusal::DUPLICATE_KEY, ParseResult::MISSING_TRAILING_BRACE,
+                  "the object already has a member of this name; without the "
+                  "reject_duplicate_keys option the last one wins");
+}
+
+// Records the note of a failure at the cursor. A failure on a '/' that starts what looks like
+// a comment is about that comment, whatever the grammar expected there.
+inline ParseResult Parser::fail(ParseResult result, std::string_view note) {
+    if (at('/')) {
+        const bool comment_like = end - cursor >= 2 && (cursor[1] == '/' || cursor[1] == '*');
+        if (!options.allow_comments && comment_like) {
+            note = "comments are not JSON; the allow_comments option accepts them";
+        } else if (options.allow_comments) {
+            note = comment_like ? "the comment is not closed" : "a comment starts with // or /*";
+        }
+    }
+    failure_note = note;
+    return result;
+}
+
+// Skips comments, each with the whitespace after it. Stops at anything else, or on a '/' that
+// starts no complete comment, where the caller then fails.
+inline void Parser::skip_comments() {
+    while (end - cursor >= 2 && *cursor == '/') {
+        if (cursor[1] == '/') {
+            cursor = std::find_if(cursor + 2, end, [](char c) { return c == '\n' || c == '\r'; });
+        } else if (cursor[1] == '*') {
+            static constexpr std::string_view closing = "*/";
+            const char* const closed = std::search(cursor + 2, end, closing.begin(), closing.end());
+            if (closed == end) {
+                return;
+            }
+            cursor = closed + closing.size();
+        } else {
+            return;
+        }
+        cursor = detail::skip_whitespace(cursor, end);
     }
 }
 
