@@ -9,15 +9,23 @@
 
 namespace json::detail {
 
+/// How text goes onto a caller's stream.
+enum class StreamText {
+    /// As Serializer::write puts it: each newline widened by the stream's locale and flushed,
+    /// as std::endl does, and the digits of \u escapes in the stream's own number formatting.
+    formatted,
+    /// The bytes a string would receive, handed on only when the buffer is full or flushed.
+    plain,
+};
+
 /// Where the writer's text goes: a caller's stream, or straight into a string.
 ///
 /// Stream: the text is gathered and handed to the stream with one write() per buffer full.
 /// Going through the stream's public functions keeps all of its own behaviour: a stream that
 /// has gone bad receives nothing, a short write sets badbit, the exceptions the caller enabled
-/// are thrown. Each newline is widened by the stream and flushed, as std::endl does, and \u
-/// escapes use the stream's own number formatting.
+/// are thrown. StreamText says how newlines and \u escapes go onto it.
 ///
-/// String: for json::serialize and json::pretty_print, whose stream nobody else sees. The text
+/// String: for json::serialize, json::pretty_print and a json::Writer onto a string. The text
 /// is what a std::ostringstream in its default state would hold: newlines widened by the
 /// global locale, escapes as its default formatting writes them; flushing such a stream does
 /// nothing, so nothing is flushed. The text is written straight into the string's own
@@ -25,11 +33,13 @@ namespace json::detail {
 /// no byte is copied on the way but when the string reallocates.
 class OutputBuffer {
   public:
-    explicit OutputBuffer(std::ostream& out)
-        : out(&out), text(nullptr), start(storage), cursor(storage), limit(storage + CAPACITY) {}
+    OutputBuffer(std::ostream& out, StreamText style)
+        : out(&out), text(nullptr), formatted(style == StreamText::formatted),
+          widened_newline_known(!formatted), widened_newline(formatted ? '\n' : default_newline()),
+          start(storage), cursor(storage), limit(storage + CAPACITY) {}
     explicit OutputBuffer(std::string& text)
-        : out(nullptr), text(&text), widened_newline_known(true),
-          widened_newline(std::use_facet<std::ctype<char>>(std::locale()).widen('\n')) {
+        : out(nullptr), text(&text), formatted(false), widened_newline_known(true),
+          widened_newline(default_newline()) {
         point_into_text(text.size());
     }
     OutputBuffer(const OutputBuffer&) = delete;
@@ -80,28 +90,30 @@ class OutputBuffer {
 
     void commit(char* end) { cursor = end; }
 
-    /// A widened newline, then a flush, with every byte before it delivered; then `indent`
-    /// spaces.
-    void new_line(std::size_t indent) {
-        if (out != nullptr) {
-            new_line_on_stream(indent);
+    /// A widened newline (on a formatted stream: then a flush, with every byte before it
+    /// delivered); then `indent` copies of `blank`, a space or a tab.
+    void new_line(std::size_t indent, char blank) {
+        if (out != nullptr && (formatted || indent > CAPACITY / 2)) {
+            new_line_on_stream(indent, blank);
             return;
         }
-        // Nothing to flush in a string: the line break and its indentation in one piece, the
-        // spaces copied in whole sixteen-byte blocks (cheaper than a call to memset for the few
-        // of them a line has) into room reserved for them; only `indent` of them are kept.
+        // Nothing to flush: the line break and its indentation in one piece, the blanks copied
+        // in whole sixteen-byte blocks (cheaper than a call to memset for the few of them a
+        // line has) into room reserved for them; only `indent` of them are kept.
         static constexpr char SPACES[17] = "                ";
+        static constexpr char TABS[17] = "\t\t\t\t\t\t\t\t\t\t\t\t\t\t\t\t";
         constexpr std::size_t block = sizeof SPACES - 1;
+        const char* const blanks = blank == '\t' ? TABS : SPACES;
         char* const line = reserve(1 + indent + block);
         *line = widened_newline;
         for (std::size_t at = 0; at < indent; at += block) {
-            std::memcpy(line + 1 + at, SPACES, block);
+            std::memcpy(line + 1 + at, blanks, block);
         }
         commit(line + 1 + indent);
     }
 
-    /// "\u" and the byte as four hexadecimal digits.
-    void unicode_escape(unsigned char byte);
+    /// "\u" and the UTF-16 code unit as four hexadecimal digits.
+    void unicode_escape(char16_t unit);
 
     /// Hands everything buffered on: to the stream, or (for a string) trims the string to the
     /// text written so far.
@@ -118,7 +130,15 @@ class OutputBuffer {
     static constexpr std::size_t CAPACITY = std::size_t{16} * 1024;
 
   private:
-    void new_line_on_stream(std::size_t indent);
+    // A newline a stream receives in its own way, or one whose indentation is too long for the
+    // stream's buffer to take in one piece.
+    void new_line_on_stream(std::size_t indent, char blank);
+
+    // What a std::ostringstream in its default state widens '\n' to: the global locale's
+    // answer.
+    static char default_newline() {
+        return std::use_facet<std::ctype<char>>(std::locale()).widen('\n');
+    }
 
     std::size_t room() const { return static_cast<std::size_t>(limit - cursor); }
 
@@ -147,8 +167,9 @@ class OutputBuffer {
 
     std::ostream* out;
     std::string* text;
-    bool widened_newline_known = false;
-    char widened_newline = '\n';
+    bool formatted; // StreamText::formatted
+    bool widened_newline_known;
+    char widened_newline;
     char* start = nullptr;
     char* cursor = nullptr;
     char* limit = nullptr;

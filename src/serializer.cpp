@@ -4,6 +4,16 @@
 
 namespace json {
 
+namespace {
+
+WriteOptions in_mode(bool pretty) {
+    WriteOptions options;
+    options.pretty = pretty;
+    return options;
+}
+
+} // namespace
+
 Serializer::Serializer() : pretty(false) {}
 
 Serializer::~Serializer() = default;
@@ -17,40 +27,40 @@ bool Serializer::pretty_print() const {
 }
 
 void Serializer::write(std::ostream& out, const Value& value) {
-    detail::OutputBuffer buffer(out);
-    detail::WriteVisitor record(buffer, pretty, 0);
-    boost::apply_visitor(record, value);
-    buffer.flush();
+    json::write(out, value, in_mode(pretty));
 }
 
-namespace {
+std::ostream& write(std::ostream& out, const Value& value, const WriteOptions& options) {
+    detail::OutputBuffer buffer(out, detail::StreamText::formatted);
+    detail::TextLayout layout(buffer, options);
+    detail::write_value(layout, value, 0);
+    buffer.flush();
+    return out;
+}
 
-// The text a Serializer would write into a std::ostringstream in its default state, written
-// straight into the string instead: nobody else sees that stream, so the stream's
+// The text a formatted stream would hold if it were a std::ostringstream in its default state,
+// written straight into the string instead: nobody else sees that stream, so the stream's
 // bookkeeping (a flush per newline in pretty mode, a copy of the text at the end) buys
 // nothing.
-std::string write_to_string(const Value& value, bool pretty) {
+std::string serialize(const Value& value, const WriteOptions& options) {
     std::string text;
     detail::OutputBuffer buffer(text);
-    detail::WriteVisitor record(buffer, pretty, 0);
-    boost::apply_visitor(record, value);
+    detail::TextLayout layout(buffer, options);
+    detail::write_value(layout, value, 0);
     buffer.flush();
     return text;
 }
 
-} // namespace
-
 std::string serialize(const Value& value) {
-    return write_to_string(value, false);
+    return serialize(value, WriteOptions());
 }
 
 std::string pretty_print(const Value& value) {
-    return write_to_string(value, true);
+    return serialize(value, in_mode(true));
 }
 
 std::ostream& operator<<(std::ostream& out, const Value& value) {
-    Serializer().write(out, value);
-    return out;
+    return json::write(out, value, WriteOptions());
 }
 
 } // namespace json

@@ -227,3 +227,158 @@ TEST(Serializer, NewlinesAndStreams) {
 }
 
 } // namespace
+
+namespace options_test {
+
+WriteOptions with(void (*set)(WriteOptions&)) {
+    WriteOptions options;
+    set(options);
+    return options;
+}
+
+// Each option alone and in pairs, against text written out by hand.
+TEST(SerializerOptions, EachOptionAloneAndInPairs) {
+    const Value document = Object{{"a", Array{1, "x/y"}},
+                                  {"e", Array{}},
+                                  {"o", Object{{"u", Undefined()}}},
+                                  {"\xC3\xA9", "\xE2\x82\xAC"}};
+    const struct {
+        WriteOptions options;
+        const char* text;
+    } rows[] = {
+        {{}, "{\"a\":[1,\"x\\/y\"],\"e\":[],\"o\":{},\"\xC3\xA9\":\"\xE2\x82\xAC\"}"},
+        // Layout options do nothing to compact text.
+        {with([](auto& o) {
+             o.indent = 2;
+             o.indent_with_tab = true;
+             o.pad_empty_containers = false;
+         }),
+         "{\"a\":[1,\"x\\/y\"],\"e\":[],\"o\":{},\"\xC3\xA9\":\"\xE2\x82\xAC\"}"},
+        {with([](auto& o) { o.pretty = true; }),
+         "{\n    \"a\":[\n        1,\n        \"x\\/y\"\n    ],\n    \"e\":[    ],\n"
+         "    \"o\":{    },\n    \"\xC3\xA9\":\"\xE2\x82\xAC\"\n}"},
+        {with([](auto& o) { o.space_after_colon = true; }),
+         "{\"a\": [1,\"x\\/y\"],\"e\": [],\"o\": {},\"\xC3\xA9\": \"\xE2\x82\xAC\"}"},
+        {with([](auto& o) { o.escape_slash = false; }),
+         "{\"a\":[1,\"x/y\"],\"e\":[],\"o\":{},\"\xC3\xA9\":\"\xE2\x82\xAC\"}"},
+        {with([](auto& o) { o.ascii_only = true; }),
+         R"({"a":[1,"x\/y"],"e":[],"o":{},"\u00e9":"\u20ac"})"},
+        {with([](auto& o) {
+             o.pretty = true;
+             o.indent = 2;
+         }),
+         "{\n  \"a\":[\n    1,\n    \"x\\/y\"\n  ],\n  \"e\":[  ],\n  \"o\":{  },\n"
+         "  \"\xC3\xA9\":\"\xE2\x82\xAC\"\n}"},
+        {with([](auto& o) {
+             o.pretty = true;
+             o.indent = 0;
+         }),
+         "{\n\"a\":[\n1,\n\"x\\/y\"\n],\n\"e\":[],\n\"o\":{},\n\"\xC3\xA9\":\"\xE2\x82\xAC\"\n}"},
+        {with([](auto& o) {
+             o.pretty = true;
+             o.indent_with_tab = true;
+         }),
+         "{\n\t\"a\":[\n\t\t1,\n\t\t\"x\\/y\"\n\t],\n\t\"e\":[\t],\n\t\"o\":{\t},\n"
+         "\t\"\xC3\xA9\":\"\xE2\x82\xAC\"\n}"},
+        {with([](auto& o) {
+             o.pretty = true;
+             o.pad_empty_containers = false;
+         }),
+         "{\n    \"a\":[\n        1,\n        \"x\\/y\"\n    ],\n    \"e\":[],\n    \"o\":{},\n"
+         "    \"\xC3\xA9\":\"\xE2\x82\xAC\"\n}"},
+        {with([](auto& o) {
+             o.pretty = true;
+             o.space_after_colon = true;
+         }),
+         "{\n    \"a\": [\n        1,\n        \"x\\/y\"\n    ],\n    \"e\": [    ],\n"
+         "    \"o\": {    },\n    \"\xC3\xA9\": \"\xE2\x82\xAC\"\n}"},
+        {with([](auto& o) {
+             o.indent_with_tab = true;
+             o.pretty = true;
+             o.pad_empty_containers = false;
+         }),
+         "{\n\t\"a\":[\n\t\t1,\n\t\t\"x\\/y\"\n\t],\n\t\"e\":[],\n\t\"o\":{},\n"
+         "\t\"\xC3\xA9\":\"\xE2\x82\xAC\"\n}"},
+        {with([](auto& o) {
+             o.ascii_only = true;
+             o.escape_slash = false;
+         }),
+         R"({"a":[1,"x/y"],"e":[],"o":{},"\u00e9":"\u20ac"})"},
+        {with([](auto& o) {
+             o.ascii_only = true;
+             o.space_after_colon = true;
+         }),
+         R"({"a": [1,"x\/y"],"e": [],"o": {},"\u00e9": "\u20ac"})"},
+        {COMMON_PRETTY, "{\n  \"a\": [\n    1,\n    \"x/y\"\n  ],\n  \"e\": [],\n  \"o\": {},\n"
+                        "  \"\xC3\xA9\": \"\xE2\x82\xAC\"\n}"},
+    };
+    for (const auto& row : rows) {
+        EXPECT_EQ(serialize(document, row.options), row.text);
+        std::ostringstream out;
+        EXPECT_EQ(&write(out, document, row.options), &out);
+        EXPECT_EQ(out.str(), row.text);
+    }
+}
+
+// The layout of the library's own pretty text and its compact text through the options.
+TEST(SerializerOptions, DefaultsAreTheLibrarysText) {
+    WriteOptions pretty;
+    pretty.pretty = true;
+    for (const Value& value : {Value(Array{Array{Array{}}, Object{{"/", 1}}}), Value("\x01"),
+                               Value(), Value(Object{})}) {
+        EXPECT_EQ(serialize(value, {}), serialize(value));
+        EXPECT_EQ(serialize(value, pretty), pretty_print(value));
+    }
+}
+
+// Characters above U+007F become \u escapes, those above U+FFFF a surrogate pair; a string
+// that is not well-formed UTF-8 cannot be written, and the offset of its first bad byte is
+// named.
+TEST(SerializerOptions, AsciiOnly) {
+    WriteOptions ascii;
+    ascii.ascii_only = true;
+    const struct {
+        const char *text, *escaped;
+    } characters[] = {
+        {"\x7f", "\"\x7f\""},
+        {"\xC2\x80", R"("\u0080")"},
+        {"\xEF\xBF\xBF", R"("\uffff")"},
+        {"\xF0\x90\x80\x80", R"("\ud800\udc00")"},
+        {"\xF4\x8F\xBF\xBF", R"("\udbff\udfff")"},
+        {"a\xC3\xA9/\n\x01 0123456789abcdef\xF0\x9F\x98\x80",
+         R"("a\u00e9\/\n\u0001 0123456789abcdef\ud83d\ude00")"},
+    };
+    for (const auto& row : characters) {
+        EXPECT_EQ(serialize(row.text, ascii), row.escaped);
+        EXPECT_EQ(serialize(Object{{row.text, 1}}, ascii), "{" + std::string(row.escaped) + ":1}");
+    }
+    const struct {
+        const char* text;
+        std::size_t offset;
+    } ill_formed[] = {{"\x80", 0},
+                      {"ab\xC3", 2},
+                      {"\xC0\xAF", 0},
+                      {"\xED\xA0\x80", 0},
+                      {"\xF4\x90\x80\x80", 0},
+                      {"\xC3\xA9\xFF", 2},
+                      {"0123456789abcdefghij\xE2\x82", 20}};
+    for (const auto& row : ill_formed) {
+        for (const Value& value : {Value(row.text), Value(Object{{row.text, 1}})}) {
+            try {
+                serialize(value, ascii);
+                ADD_FAILURE() << "no exception for " << row.text;
+            } catch (const std::invalid_argument& error) {
+                EXPECT_NE(std::string(error.what()).find("byte " + std::to_string(row.offset)),
+                          std::string::npos)
+                    << error.what();
+            }
+        }
+    }
+    // On a caller's stream the digits follow its flags, as for control characters.
+    std::ostringstream upper;
+    upper << std::uppercase;
+    write(upper, "\xC3\xA9", ascii);
+    EXPECT_EQ(upper.str(), R"("\u00E9")");
+}
+
+} // namespace options_test

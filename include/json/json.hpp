@@ -1,12 +1,13 @@
 #ifndef JSON_JSON_HPP
 #define JSON_JSON_HPP
 
-// Everything jsonvalue offers: the value model, conversions, the builders, the writer and
-// parsing.
+// Everything jsonvalue offers: the value model, conversions, the builders, the writers
+// (from a document or from events) and parsing.
 #include <json/builders.hpp>
 #include <json/convert.hpp>
 #include <json/parse.hpp>
 #include <json/serializer.hpp>
 #include <json/value.hpp>
+#include <json/writer.hpp>
 
 #endif

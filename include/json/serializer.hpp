@@ -9,6 +9,44 @@
 
 namespace json {
 
+/// How JSON text is laid out and escaped. An aggregate: members may be set by name
+/// (`{.pretty = true, .indent = 2}` in C++20). The defaults give the library's compact text;
+/// with `pretty` alone they give its pretty text (Serializer, json::pretty_print).
+struct WriteOptions {
+    /// Every element and member on a line of its own, indented by its nesting level; an empty
+    /// container stays on one line.
+    bool pretty = false;
+    /// Spaces per level of indentation in pretty text; 0 gives line breaks and no indentation.
+    unsigned indent = 4;
+    /// One tab per level of indentation in pretty text instead of `indent` spaces.
+    bool indent_with_tab = false;
+    /// A space after the colon of each member: `"a": 1`.
+    bool space_after_colon = false;
+    /// `/` written as `\/`; when false, as itself.
+    bool escape_slash = true;
+    /// Every character above U+007F written as a `\uXXXX` escape in lower-case hexadecimal
+    /// (characters above U+FFFF as a UTF-16 surrogate pair of them), so the text is pure ASCII.
+    /// A string that is not well-formed UTF-8 then cannot be written: std::invalid_argument,
+    /// naming the offset of the offending byte inside the string. When false, bytes from 0x80
+    /// up are written as they are, without checking them.
+    bool ascii_only = false;
+    /// In pretty text, an empty array or object at level L holds the indentation of level L
+    /// (`[    ]` one level down); when false, every empty container is `[]` or `{}`.
+    bool pad_empty_containers = true;
+};
+
+/// The pretty layout most JSON tools write: two spaces per level, `"a": 1`, `[]` and `{}` for
+/// empty containers, `/` as itself, other characters than ASCII as they are.
+inline constexpr WriteOptions COMMON_PRETTY = [] {
+    WriteOptions options;
+    options.pretty = true;
+    options.indent = 2;
+    options.space_after_colon = true;
+    options.escape_slash = false;
+    options.pad_empty_containers = false;
+    return options;
+}();
+
 /// Writes a Value as JSON text onto a std::ostream, compact or pretty.
 ///
 /// Text produced:
@@ -29,7 +67,8 @@ namespace json {
 ///   Undefined is left out with its separator, so the text is always valid JSON; an Undefined
 ///   top-level value writes nothing.
 ///
-/// Documents of any depth are written with a bounded call stack.
+/// Documents of any depth are written with a bounded call stack. json::write with WriteOptions
+/// writes the same way, in any layout.
 class JSONVALUE_API Serializer {
   public:
     /// Compact mode.
@@ -60,6 +99,22 @@ JSONVALUE_API std::string pretty_print(const Value& value);
 
 /// Writes the compact text of `value` onto `out`, as Serializer::write does; returns `out`.
 JSONVALUE_API std::ostream& operator<<(std::ostream& out, const Value& value);
+
+/// The text of `value` laid out as `options` ask; `serialize(value, {})` is `serialize(value)`
+/// and with only `pretty` set it is `pretty_print(value)`. Linear in the size of the document,
+/// with a bounded call stack. Throws std::invalid_argument when `options.ascii_only` is set and
+/// a string (or member name) is not well-formed UTF-8, and std::bad_alloc; nothing is returned
+/// then.
+JSONVALUE_API std::string serialize(const Value& value, const WriteOptions& options);
+
+/// Writes the text of serialize(value, options) onto `out` as Serializer::write writes onto a
+/// stream (a bad stream receives nothing; in pretty text each newline is widened by the
+/// stream's locale and flushed; the digits of `\u` escapes follow the stream's formatting
+/// flags); returns `out`. With only `pretty` set in `options` it is Serializer::write in pretty
+/// mode. Throws what Serializer::write throws, and std::invalid_argument as serialize(value,
+/// options) does, leaving the text written so far on the stream (basic guarantee).
+JSONVALUE_API std::ostream& write(std::ostream& out, const Value& value,
+                                  const WriteOptions& options);
 
 } // namespace json
 

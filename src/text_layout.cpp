@@ -1,0 +1,178 @@
+#include "text_layout.hpp"
+
+#include <json/detail/utf8.hpp>
+#include <number_text.hpp>
+
+#include <array>
+#include <cmath>
+#include <limits>
+#include <stdexcept>
+#include <string>
+
+namespace json::detail {
+
+namespace {
+
+// For each byte: 0 when it is written as it is, 'u' for a \u escape, otherwise the letter that
+// follows the backslash of its two-character escape. The slash is in the table, and only
+// reaches it when it is to be escaped.
+constexpr std::array<char, 256> make_escape_table() {
+    std::array<char, 256> table{};
+    for (int byte = 0; byte < 0x20; ++byte) {
+        table[byte] = 'u';
+    }
+    table['\b'] = 'b';
+    table['\t'] = 't';
+    table['\n'] = 'n';
+    table['\f'] = 'f';
+    table['\r'] = 'r';
+    table['"'] = '"';
+    table['/'] = '/';
+    table['\\'] = '\\';
+    return table;
+}
+
+constexpr std::array<char, 256> ESCAPES = make_escape_table();
+
+[[noreturn]] void throw_ill_formed(std::size_t offset) {
+    throw std::invalid_argument("json: byte " + std::to_string(offset) +
+                                " of a string is not well-formed UTF-8, which ASCII-only text "
+                                "cannot write");
+}
+
+// The length of the NUL-terminated text in a number buffer of `size` bytes, read one byte at a
+// time on purpose: the text was stored a byte or two at a time an instant ago, and a wider load
+// over those stores cannot be served from the store buffer and waits for them to reach the
+// cache, which costs more than the few byte loads of a number's text.
+template <std::size_t size>
+std::size_t text_length(const char* text) {
+    std::size_t length = 0;
+    while (length != size && text[length] != '\0') {
+        ++length;
+    }
+    return length;
+}
+
+} // namespace
+
+TextLayout::TextLayout(OutputBuffer& buffer, const WriteOptions& options)
+    : buffer(buffer), pretty(options.pretty), pad_empty(options.pad_empty_containers),
+      blank(options.indent_with_tab ? '\t' : ' '),
+      indent_width(options.indent_with_tab ? 1 : options.indent),
+      escapes(options.escape_slash ? (options.ascii_only ? Escapes::slash_and_high : Escapes::slash)
+                                   : (options.ascii_only ? Escapes::high : Escapes::none)),
+      colon{':', ' '}, colon_size(options.space_after_colon ? 2 : 1) {}
+
+void TextLayout::check_string(std::string_view text) const {
+    if (escapes != Escapes::slash_and_high && escapes != Escapes::high) {
+        return;
+    }
+    const char* const end = text.data() + text.size();
+    for (const char* at = text.data(); at != end; ++at) {
+        // Stops at a byte to escape, which is fine, or at an ill-formed one.
+        at = find_special_or_ill_formed<false>(at, end);
+        if (at == end) {
+            break;
+        }
+        if (static_cast<unsigned char>(*at) >= 0x80) {
+            throw_ill_formed(static_cast<std::size_t>(at - text.data()));
+        }
+    }
+}
+
+void TextLayout::quoted_with_other_escapes(std::string_view text, bool sixteen_readable,
+                                           std::size_t colon_count) {
+    switch (escapes) {
+    case Escapes::slash:
+        quoted<true, false>(text, sixteen_readable, colon_count);
+        break;
+    case Escapes::slash_and_high:
+        quoted<true, true>(text, sixteen_readable, colon_count);
+        break;
+    case Escapes::none:
+        quoted<false, false>(text, sixteen_readable, colon_count);
+        break;
+    case Escapes::high:
+        quoted<false, true>(text, sixteen_readable, colon_count);
+        break;
+    }
+}
+
+template <bool EscapeSlash, bool EscapeHigh>
+void TextLayout::escaped(std::string_view text, std::size_t colon_count) {
+    buffer.put('"');
+    const char* run = text.data();
+    const char* const end = run + text.size();
+    for (;;) {
+        // Bytes that need no escape go out as one run.
+        const char* const byte = find_special_byte<EscapeSlash, EscapeHigh>(run, end);
+        buffer.append(run, static_cast<std::size_t>(byte - run));
+        if (byte == end) {
+            break;
+        }
+        const auto code = static_cast<unsigned char>(*byte);
+        if (EscapeHigh && code >= 0x80) {
+            const std::size_t length = utf8_sequence_length(byte, end);
+            if (length == 0) {
+                throw_ill_formed(static_cast<std::size_t>(byte - text.data()));
+            }
+            const char32_t character = decode_utf8(byte, length);
+            if (character > 0xFFFF) {
+                // UTF-16's surrogate pair: the 20 bits above U+10000, ten in each half.
+                const char32_t above = character - 0x10000;
+                buffer.unicode_escape(static_cast<char16_t>(0xD800 + (above >> 10U)));
+                buffer.unicode_escape(static_cast<char16_t>(0xDC00 + (above & 0x3FFU)));
+            } else {
+                buffer.unicode_escape(static_cast<char16_t>(character));
+            }
+            run = byte + length;
+            continue;
+        }
+        const char escape = ESCAPES[code];
+        if (escape == 'u') {
+            buffer.unicode_escape(code);
+        } else {
+            const char pair[2] = {'\\', escape};
+            buffer.append(pair, 2);
+        }
+        run = byte + 1;
+    }
+    buffer.put('"');
+    for (std::size_t at = 0; at != colon_count; ++at) {
+        buffer.put(colon[at]);
+    }
+}
+
+template void TextLayout::escaped<true, false>(std::string_view, std::size_t);
+template void TextLayout::escaped<true, true>(std::string_view, std::size_t);
+template void TextLayout::escaped<false, false>(std::string_view, std::size_t);
+template void TextLayout::escaped<false, true>(std::string_view, std::size_t);
+
+void TextLayout::number(double number) {
+    formatted_number(number, getDoubleValueStr);
+}
+
+void TextLayout::number(float number) {
+    formatted_number(number, getFloatValueStr);
+}
+
+// NaN and the infinities are written as strings; every finite number is formatted by the
+// number-text library straight into 80 zeroed bytes of the buffer, then kept up to its NUL.
+template <typename Number>
+void TextLayout::formatted_number(Number number, int (*format)(char*, Number)) {
+    if (std::isnan(number)) {
+        buffer.append("\"NaN\"", 5);
+    } else if (number > std::numeric_limits<Number>::max()) {
+        buffer.append("\"Inf\"", 5);
+    } else if (number < -std::numeric_limits<Number>::max()) {
+        buffer.append("\"-Inf\"", 6);
+    } else {
+        constexpr std::size_t size = 80;
+        char* const text = buffer.reserve(size);
+        std::memset(text, 0, size);
+        format(text, number);
+        buffer.commit(text + text_length<size>(text));
+    }
+}
+
+} // namespace json::detail

@@ -1,0 +1,144 @@
+#ifndef JSON_SRC_TEXT_LAYOUT_HPP
+#define JSON_SRC_TEXT_LAYOUT_HPP
+
+#include "output_buffer.hpp"
+
+#include <json/detail/byte_scan.hpp>
+#include <json/serializer.hpp>
+
+#include <cstddef>
+#include <cstring>
+#include <string_view>
+
+namespace json::detail {
+
+/// How JSON text looks under a set of WriteOptions, for every writer of the library: what goes
+/// between values (commas, line breaks, indentation, the colon after a member name), how an
+/// empty container is written, and how strings and numbers are written and escaped. The
+/// writers decide what comes next (a walk over a Value, or a json::Writer's events); this
+/// decides how it looks, so that both give the same text.
+///
+/// Levels count the containers a value is inside: the top-level value is at level 0, the
+/// contents of a container at level L are at level L + 1.
+class TextLayout {
+  public:
+    TextLayout(OutputBuffer& buffer, const WriteOptions& options);
+
+    void null() { buffer.append("null", 4); }
+    void boolean(bool value) {
+        if (value) {
+            buffer.append("true", 4);
+        } else {
+            buffer.append("false", 5);
+        }
+    }
+    /// The number's shortest text; NaN and the infinities as the strings "NaN", "Inf", "-Inf".
+    void number(double number);
+    void number(float number);
+    /// A number's text as it is (the caller has checked that it is one).
+    void number_text(std::string_view text) { buffer.append(text.data(), text.size()); }
+
+    /// `text` quoted and escaped. `sixteen_readable`: sixteen bytes may be read at text.data()
+    /// (as in a std::string whose capacity is at least 15), which lets a short string be
+    /// checked and copied in one piece. Throws std::invalid_argument where check_string does,
+    /// after writing part of the string.
+    void string(std::string_view text, bool sixteen_readable) { quoted(text, sixteen_readable, 0); }
+    /// A member name as string() writes it, and its colon.
+    void member_name(std::string_view name, bool sixteen_readable) {
+        quoted(name, sixteen_readable, colon_size);
+    }
+    /// Throws std::invalid_argument, naming the offset of the first offending byte, when the
+    /// text must be ASCII and `text` is not well-formed UTF-8, so cannot be written. Linear.
+    void check_string(std::string_view text) const;
+
+    /// The opening bracket of a container: '[' or '{'.
+    void open(char bracket) { buffer.put(bracket); }
+    /// What comes before an element or a member of a container at `level`: a comma unless it
+    /// is the first, and in pretty text a line break and the indentation of level + 1.
+    void start_entry(bool first, std::size_t level) {
+        if (!first) {
+            buffer.put(',');
+        }
+        if (pretty) {
+            buffer.new_line(indent_width * (level + 1), blank);
+        }
+    }
+    /// The end of a container at `level` (']' or '}'), `empty` when nothing was written in it.
+    void close(char bracket, bool empty, std::size_t level) {
+        if (pretty) {
+            if (!empty) {
+                buffer.new_line(indent_width * level, blank);
+            } else if (pad_empty) {
+                buffer.fill(blank, indent_width * level);
+            }
+        }
+        buffer.put(bracket);
+    }
+    /// An empty container at `level`, its two brackets given, written whole: the text open()
+    /// and close() would give.
+    void empty_container(const char* brackets, std::size_t level) {
+        if (pretty) {
+            open(brackets[0]);
+            close(brackets[1], true, level);
+        } else {
+            buffer.append(brackets, 2);
+        }
+    }
+
+  private:
+    // Which bytes a string's escapes cover besides the quote, the backslash and the control
+    // characters: the slash, and every byte from 0x80 up when the text must be ASCII.
+    enum class Escapes { slash, slash_and_high, none, high };
+
+    // The quoted string, then the first `colon_count` bytes of the colon (0 for a string). The
+    // library's own escapes are dispatched to inline; the other sets out of line.
+    void quoted(std::string_view text, bool sixteen_readable, std::size_t colon_count) {
+        if (escapes == Escapes::slash) {
+            quoted<true, false>(text, sixteen_readable, colon_count);
+        } else {
+            quoted_with_other_escapes(text, sixteen_readable, colon_count);
+        }
+    }
+
+    void quoted_with_other_escapes(std::string_view text, bool sixteen_readable,
+                                   std::size_t colon_count);
+
+    template <bool EscapeSlash, bool EscapeHigh>
+    void quoted(std::string_view text, bool sixteen_readable, std::size_t colon_count) {
+        constexpr std::size_t short_size = 16;
+        if (text.size() < short_size && sixteen_readable &&
+            short_run_is_plain<EscapeSlash, EscapeHigh>(text.data(), text.size())) {
+            // Most keys and many values: a short string with nothing to escape. All sixteen
+            // bytes are copied at once and only the string's own are kept; both bytes of the
+            // colon too, of which a member name keeps its own.
+            char* const out = buffer.reserve(short_size + 4);
+            out[0] = '"';
+            std::memcpy(out + 1, text.data(), short_size);
+            out[1 + text.size()] = '"';
+            std::memcpy(out + 2 + text.size(), colon, sizeof colon);
+            buffer.commit(out + 2 + text.size() + colon_count);
+            return;
+        }
+        escaped<EscapeSlash, EscapeHigh>(text, colon_count);
+    }
+
+    // quoted()'s general case: a string of any length, its escapes written out.
+    template <bool EscapeSlash, bool EscapeHigh>
+    void escaped(std::string_view text, std::size_t colon_count);
+
+    template <typename Number>
+    void formatted_number(Number number, int (*format)(char*, Number));
+
+    OutputBuffer& buffer;
+    bool pretty;
+    bool pad_empty;
+    char blank; // what indentation is made of: a space or a tab
+    std::size_t indent_width;
+    Escapes escapes;
+    char colon[2];
+    std::size_t colon_size;
+};
+
+} // namespace json::detail
+
+#endif
