@@ -1,6 +1,7 @@
 #include "kind_message.hpp"
 
 #include <json/convert.hpp>
+#include <json/serializer.hpp>
 
 #include <array>
 #include <charconv>
@@ -50,10 +51,13 @@ std::string prefixed(const std::string& token, const char* message) {
 } // namespace
 
 std::string kind_message(const char* expected, const Value& found) {
+    // What the Value holds in JSON's terms, as `expected` is named: a float is a JSON number
+    // like a double, and Undefined is no JSON value at all.
+    static const char* const UNDEFINED_NAME = "no value";
     static constexpr const char* const* NAMES[] = {
-        &traits<Undefined>::name, &traits<Null>::name,        &traits<bool>::name,
-        &traits<double>::name,    &traits<std::string>::name, &traits<Array>::name,
-        &traits<Object>::name,    &traits<float>::name,
+        &UNDEFINED_NAME,       &traits<Null>::name,        &traits<bool>::name,
+        &traits<double>::name, &traits<std::string>::name, &traits<Array>::name,
+        &traits<Object>::name, &traits<double>::name,
     };
     return std::string("expected ") + expected + ", found " + *NAMES[found.which()];
 }
@@ -86,7 +90,9 @@ void throw_wrong_size(std::size_t size, std::size_t found) {
 }
 
 void throw_unknown_enumerator(const std::string& name) {
-    throw std::invalid_argument("unknown enumerator \"" + name + "\"");
+    // Written as a JSON string: a control character or NUL byte in it stays visible, where
+    // what() would end the message at a NUL.
+    throw std::invalid_argument("unknown enumerator " + serialize(Value(name)));
 }
 
 void throw_unnamed_enum_value(long long value) {

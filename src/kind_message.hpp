@@ -7,8 +7,8 @@
 
 namespace json::detail {
 
-/// "expected EXPECTED, found KIND", KIND being the display name of what `found` holds: the
-/// text of every wrong-kind error.
+/// "expected EXPECTED, found KIND", KIND being the JSON kind `found` holds ("JSON number" for
+/// a double and a float alike, "no value" for Undefined): the text of every wrong-kind error.
 std::string kind_message(const char* expected, const Value& found);
 
 } // namespace json::detail

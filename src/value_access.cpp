@@ -22,9 +22,9 @@ Alternative& checked(Value& value, int index) {
     return boost::get<Alternative>(value);
 }
 
-std::string index_out_of_range(std::size_t index, std::size_t size) {
-    return "index " + std::to_string(index) + " out of range for a " + traits<Array>::name +
-           " of " + std::to_string(size) + " elements";
+std::string index_out_of_range(std::string_view index, std::size_t size) {
+    return "index " + std::string(index) + " out of range for a " + traits<Array>::name + " of " +
+           std::to_string(size) + " elements";
 }
 
 // Refuses what is not a JSON Pointer: text that is not empty and does not start with '/', or
@@ -58,28 +58,28 @@ std::string member_name(std::string_view token) {
     return name;
 }
 
-constexpr std::size_t NO_INDEX = static_cast<std::size_t>(-1);
+// Whether a token names an element: "0", or digits without a leading zero, of any length ("-",
+// the element after the last, never exists here).
+bool is_index(std::string_view token) {
+    return !token.empty() && token.find_first_not_of("0123456789") == std::string_view::npos &&
+           (token[0] != '0' || token.size() == 1);
+}
 
-// The element index a token names: "0", or digits without a leading zero; NO_INDEX otherwise
-// (including "-", the element after the last, which never exists here).
-std::size_t element_index(std::string_view token) {
-    std::size_t index = NO_INDEX;
-    if (token.empty() || (token[0] == '0' && token.size() > 1)) {
-        return NO_INDEX;
-    }
-    const char* end = token.data() + token.size();
-    const auto [stop, error] = std::from_chars(token.data(), end, index);
-    return error == std::errc() && stop == end ? index : NO_INDEX;
+// The element an index token names, or null when it is past the end (an index too large for
+// std::size_t is past the end of every Array).
+Value* element(Array& items, std::string_view index) {
+    std::size_t position = 0;
+    const std::from_chars_result read =
+        std::from_chars(index.data(), index.data() + index.size(), position);
+    return read.ec == std::errc() && position < items.size() ? &items[position] : nullptr;
 }
 
 Value* child(Value& parent, std::string_view token) {
     if (parent.is_object()) {
         return parent.find(member_name(token));
     }
-    if (parent.is_array()) {
-        Array& items = boost::get<Array>(parent);
-        const std::size_t index = element_index(token);
-        return index < items.size() ? &items[index] : nullptr;
+    if (parent.is_array() && is_index(token)) {
+        return element(boost::get<Array>(parent), token);
     }
     return nullptr;
 }
@@ -115,11 +115,10 @@ std::string not_found(const Value& parent, std::string_view token) {
         return "no member \"" + member_name(token) + "\"";
     }
     if (parent.is_array()) {
-        const std::size_t index = element_index(token);
-        if (index == NO_INDEX) {
+        if (!is_index(token)) {
             return "\"" + std::string(token) + "\" is no index of a " + traits<Array>::name;
         }
-        return index_out_of_range(index, boost::get<Array>(parent).size());
+        return index_out_of_range(token, boost::get<Array>(parent).size());
     }
     // Anything else has no values inside: say what it is.
     return detail::kind_message("JSON object or array", parent);
@@ -168,7 +167,8 @@ Value* Value::find(const std::string& key) {
     }
     Object& members = boost::get<Object>(*this);
     const auto found = members.find(key);
-    return found == members.end() ? nullptr : &found->second;
+    // A member holding Undefined has no JSON text (the writer leaves it out): it is absent.
+    return found == members.end() || found->second.is_undefined() ? nullptr : &found->second;
 }
 
 const Value* Value::find(const std::string& key) const {
@@ -176,12 +176,12 @@ const Value* Value::find(const std::string& key) const {
 }
 
 Value& Value::at(const std::string& key) {
-    Object& members = as_object();
-    const auto found = members.find(key);
-    if (found == members.end()) {
+    static_cast<void>(as_object()); // throws when this is no Object
+    Value* const member = find(key);
+    if (member == nullptr) {
         throw std::out_of_range("no member \"" + key + "\"");
     }
-    return found->second;
+    return *member;
 }
 
 const Value& Value::at(const std::string& key) const {
@@ -191,7 +191,7 @@ const Value& Value::at(const std::string& key) const {
 Value& Value::at(std::size_t index) {
     Array& items = as_array();
     if (index >= items.size()) {
-        throw std::out_of_range(index_out_of_range(index, items.size()));
+        throw std::out_of_range(index_out_of_range(std::to_string(index), items.size()));
     }
     return items[index];
 }

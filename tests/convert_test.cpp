@@ -8,8 +8,10 @@
 #include <gtest/gtest.h>
 
 #include <array>
+#include <cmath>
 #include <cstdint>
 #include <deque>
+#include <limits>
 #include <list>
 #include <map>
 #include <optional>
@@ -127,6 +129,8 @@ TEST(Convert, RangeAndKindFailuresNameTheNumber) {
                                      "found 1e+300");
     EXPECT_EQ(failure<int>("7"), "invalid: expected JSON number, found JSON string");
     EXPECT_EQ(failure<std::nullptr_t>(0), "invalid: expected JSON null, found JSON number");
+    EXPECT_EQ(failure<std::nullptr_t>(2.5f), "invalid: expected JSON null, found JSON number");
+    EXPECT_EQ(failure<int>(Value()), "invalid: expected JSON number, found no value");
     EXPECT_EQ(failure<IntArray3>(json::Array{1, 2}),
               "missing: /2: missing element (expected JSON array of 3 elements, found 2)");
     EXPECT_EQ(failure<IntPair>(json::Array{1, 2, 3}),
@@ -136,6 +140,24 @@ TEST(Convert, RangeAndKindFailuresNameTheNumber) {
     EXPECT_EQ(
         failure<std::vector<std::vector<int>>>(json::Array{json::Array{}, json::Array{1, "x"}}),
         "invalid: /1/1: expected JSON number, found JSON string");
+}
+
+// Every float the library writes reads back as the same float; doubles from halfway between
+// the largest float and 2^128 up are refused.
+TEST(Convert, FloatsWrittenConvertBack) {
+    constexpr float max = std::numeric_limits<float>::max();
+    for (const float number : {max, -max, std::numeric_limits<float>::min(),
+                               std::numeric_limits<float>::denorm_min(), 0.1f}) {
+        Value read;
+        ASSERT_TRUE(json::parse(json::serialize(value_from(number)), read, {})) << number;
+        EXPECT_EQ(value_to<float>(read), number) << json::serialize(read);
+    }
+    const double halfway = std::ldexp(1.0, 128) - std::ldexp(1.0, 103);
+    EXPECT_EQ(value_to<float>(std::nextafter(halfway, 0.0)), max);
+    EXPECT_EQ(value_to<float>(-std::nextafter(halfway, 0.0)), -max);
+    for (const double refused : {halfway, -halfway}) {
+        EXPECT_THROW(value_to<float>(refused), std::invalid_argument) << refused;
+    }
 }
 
 const char* const ORDER_TEXT =
@@ -176,6 +198,9 @@ TEST(Convert, DescribedStructsAndEnums) {
          "missing: /notes/gift/1: missing element (expected "
          "JSON array of 2 elements, found 1)"},
         {"/items/1/name", Value(), "missing: /items/1/name: missing member"},
+        // The whole string is the name, not the part before a NUL byte.
+        {"/items/0/price/currency", std::string("EUR\0junk", 8),
+         "invalid: /items/0/price/currency: unknown enumerator \"EUR\\u0000junk\""},
     };
     for (const auto& row : broken) {
         Value document = converted;

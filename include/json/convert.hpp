@@ -27,8 +27,8 @@
 #include <json/value.hpp>
 
 #include <boost/describe/enum.hpp>
-#include <boost/describe/enum_from_string.hpp>
 #include <boost/describe/enum_to_string.hpp>
+#include <boost/describe/enumerators.hpp>
 #include <boost/describe/members.hpp>
 #include <boost/mp11/algorithm.hpp>
 
@@ -56,8 +56,8 @@ T value_to(const Value& value);
 
 namespace detail {
 
-/// Throws std::invalid_argument "expected EXPECTED, found KIND", KIND being the display name
-/// of what `found` holds.
+/// Throws std::invalid_argument "expected EXPECTED, found KIND", KIND being the JSON kind
+/// `found` holds ("JSON number" for a float too, "no value" for Undefined).
 [[noreturn]] JSONVALUE_API void throw_wrong_kind(const char* expected, const Value& found);
 
 /// Throws std::invalid_argument "expected an integer from MIN to MAX, found NUMBER".
@@ -337,39 +337,55 @@ template <typename T>
 T to_floating(const Value& in) {
     const double number = in.as_number();
     if constexpr (sizeof(T) < sizeof(double)) {
-        // Narrowing a finite double beyond the float's range is undefined: refuse it.
-        if (std::isfinite(number) && std::fabs(number) > std::numeric_limits<T>::max()) {
+        // Narrowing a finite double that does not round to a finite T is undefined: refuse it.
+        // Doubles round to T's largest value up to halfway to the next power of two; halfway
+        // rounds to even, which is that power, beyond the range. So the shortest text of the
+        // largest float, 3.4028235e+38, which is above FLT_MAX, converts back to it.
+        using limits = std::numeric_limits<T>;
+        const double halfway =
+            static_cast<double>(limits::max()) +
+            std::ldexp(1.0, limits::max_exponent - limits::digits - 1); // half its last step
+        if (std::isfinite(number) && std::fabs(number) >= halfway) {
             throw_not_a_float(number);
         }
     }
     return static_cast<T>(number);
 }
 
+// Compares whole strings, not NUL-terminated prefixes: "red\u0000junk" names no enumerator.
 template <typename T>
 T to_enum(const Value& in) {
+    const std::string& name = in.as_string();
     T value{};
-    if (!boost::describe::enum_from_string(in.as_string().c_str(), value)) {
-        throw_unknown_enumerator(in.as_string());
+    bool found = false;
+    boost::mp11::mp_for_each<boost::describe::describe_enumerators<T>>([&](auto enumerator) {
+        if (!found && name == enumerator.name) {
+            value = enumerator.value;
+            found = true;
+        }
+    });
+    if (!found) {
+        throw_unknown_enumerator(name);
     }
     return value;
 }
 
 template <typename T>
 T to_struct(const Value& in) {
-    const Object& members = in.as_object();
+    static_cast<void>(in.as_object()); // throws when `in` is no Object
     T value{};
     boost::mp11::mp_for_each<described_members<T>>([&](auto member) {
         using Member = std::remove_reference_t<decltype(value.*member.pointer)>;
-        const auto found = members.find(member.name);
-        if (found == members.end() || found->second.is_undefined()) {
+        const std::string_view name = member.name;
+        const Value* const found = in.find(member.name);
+        if (found == nullptr) {
             if constexpr (is_optional<Member>::value) {
                 value.*member.pointer = std::nullopt;
             } else {
-                below(std::string_view(member.name), [] { throw_missing_member(); });
+                below(name, [] { throw_missing_member(); });
             }
         } else {
-            value.*member.pointer =
-                below(found->first, [&] { return value_to<Member>(found->second); });
+            value.*member.pointer = below(name, [&] { return value_to<Member>(*found); });
         }
     });
     return value;
@@ -503,12 +519,16 @@ T value_to(const Value& value) {
 
 template <typename T>
 T Value::value_or(const std::string& key, const T& fallback) const {
-    const Object& members = as_object();
-    const auto found = members.find(key);
-    if (found == members.end() || found->second.is_undefined()) {
+    static_cast<void>(as_object()); // throws when this is no Object
+    const Value* const member = find(key);
+    if (member == nullptr) {
         return fallback;
     }
-    return detail::below(key, [&] { return value_to<T>(found->second); });
+    return detail::below(key, [&] { return value_to<T>(*member); });
+}
+
+inline std::string Value::value_or(const std::string& key, const char* fallback) const {
+    return value_or<std::string>(key, fallback);
 }
 
 } // namespace json

@@ -219,7 +219,10 @@ class JSONVALUE_API Value : public detail::ValueVariant {
     const Object& as_object() const;      ///< The Object held.
 
     // Lookups. None of them inserts anything, and none allocates except to build a
-    // std::string key longer than the small-string buffer.
+    // std::string key longer than the small-string buffer. A member that holds Undefined is
+    // absent for all of them, for value_or and for value_to (json/convert.hpp), as it is for
+    // the writer, which leaves it out: find and find_pointer return null for it, contains
+    // false, at and at_pointer throw. An Object's own size() and iteration still count it.
 
     /// The member named `key`, or null when this is no Object or has no such member.
     /// Logarithmic in the number of members. Throws nothing.
@@ -259,11 +262,14 @@ class JSONVALUE_API Value : public detail::ValueVariant {
     const Value& at_pointer(std::string_view pointer) const;
 
     /// The member named `key` converted with json::value_to<T> (json/convert.hpp), or
-    /// `fallback` when there is no such member or it holds Undefined. A member that does not
-    /// convert throws as value_to does, with "/key" at the start of the message: it is never
-    /// replaced by the fallback. Throws std::invalid_argument when this is no Object.
+    /// `fallback` when there is no such member. A member that does not convert throws as
+    /// value_to does, with "/key" at the start of the message: it is never replaced by the
+    /// fallback. Throws std::invalid_argument when this is no Object.
     template <typename T>
     T value_or(const std::string& key, const T& fallback) const;
+    /// The member named `key` as a std::string, or `fallback`: value_or<std::string>, so that
+    /// a string literal (or any `const char*`) can be the fallback. Throws as value_or does.
+    std::string value_or(const std::string& key, const char* fallback) const;
 };
 
 /// Exchanges two Values as Value::swap does; found by argument-dependent lookup, so that
