@@ -1,0 +1,96 @@
+// Parsing from a std::istream: documents and their failures, streams that fail while they are
+// read or were never readable, and the exceptions a caller enabled on the stream.
+#include <json/json.hpp>
+
+#include <gtest/gtest.h>
+
+#include <fstream>
+#include <sstream>
+#include <stdexcept>
+#include <streambuf>
+#include <string>
+
+namespace {
+
+using json::ParseResult;
+using json::Value;
+
+struct DiskGone : std::runtime_error {
+    DiskGone() : std::runtime_error("disk gone") {}
+};
+
+// A stream buffer that gives some text, then throws.
+class BrokenBuffer : public std::streambuf {
+  public:
+    explicit BrokenBuffer(std::string text) : text(std::move(text)) {
+        setg(this->text.data(), this->text.data(), this->text.data() + this->text.size());
+    }
+
+  private:
+    int_type underflow() override { throw DiskGone(); }
+    std::string text;
+};
+
+TEST(ParseStream, DocumentsAndTheirFailures) {
+    std::istringstream good("  {\"a\": [1, 2]}\n");
+    Value out = 5;
+    ASSERT_TRUE(json::parse(good, out, {}));
+    EXPECT_EQ(json::serialize(out), R"({"a":[1,2]})");
+    EXPECT_TRUE(good.eof() && !good.fail());
+
+    std::istringstream bad("[1,\n 2,,]");
+    const json::ParseReport report = json::parse(bad, out, {});
+    EXPECT_EQ(report.result, ParseResult::MISSING_LEADING_DIGIT);
+    EXPECT_EQ(std::make_pair(report.line, report.column),
+              std::make_pair(std::size_t{2}, std::size_t{4}));
+}
+
+// What a stream that cannot give a document is reported as; `out` keeps its value throughout.
+TEST(ParseStream, StreamsThatGiveNoDocument) {
+    BrokenBuffer buffer("[1, 2, 3]"); // a whole document, then the failure
+    std::istream broken(&buffer);
+    std::ifstream missing("/nonexistent/missing.json");
+    std::istream no_buffer(nullptr);
+    std::istringstream drained("[1]");
+    std::string whole;
+    drained >> whole; // reads to the end: eofbit set
+    const struct {
+        const char* name;
+        std::istream& stream;
+        ParseResult result;
+        const char* note;
+        std::size_t offset;
+    } rows[] = {
+        {"broken", broken, ParseResult::UNEXPECTED_END_OF_INPUT,
+         "the stream failed while it was read", 9},
+        {"missing file", missing, ParseResult::UNEXPECTED_END_OF_INPUT,
+         "the stream was not readable", 0},
+        {"no buffer", no_buffer, ParseResult::UNEXPECTED_END_OF_INPUT,
+         "the stream was not readable", 0},
+        {"at the end", drained, ParseResult::EMPTY_INPUT, "", 0},
+    };
+    for (const auto& row : rows) {
+        Value out = "kept";
+        const json::ParseReport report = json::parse(row.stream, out, {});
+        EXPECT_EQ(report.result, row.result) << row.name;
+        EXPECT_EQ(report.note, row.note) << row.name;
+        EXPECT_EQ(report.offset, row.offset) << row.name;
+        EXPECT_TRUE(row.stream.fail()) << row.name;
+        EXPECT_EQ(out, "kept") << row.name;
+    }
+    EXPECT_TRUE(broken.bad());
+}
+
+// With exceptions enabled for badbit, the stream buffer's own exception reaches the caller, as
+// from the standard input functions, and the stream is bad.
+TEST(ParseStream, TheBuffersExceptionPassesOn) {
+    BrokenBuffer throwing("[1");
+    std::istream strict(&throwing);
+    strict.exceptions(std::ios::badbit);
+    Value out;
+    EXPECT_THROW(json::parse(strict, out, {}), DiskGone);
+    EXPECT_TRUE(strict.bad());
+    EXPECT_EQ(strict.exceptions(), std::ios::badbit);
+}
+
+} // namespace
