@@ -1,0 +1,279 @@
+#include <json/json.hpp>
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <fstream>
+#include <functional>
+#include <sstream>
+#include <stdexcept>
+
+namespace {
+
+using namespace json;
+
+// Hands a Writer the events of a walk over `value`: members in key order, members holding
+// Undefined left out, Undefined elements as null, doubles as number(double).
+void emit(const Value& value, Writer& writer) {
+    switch (value.which()) {
+    case detail::NULL_INDEX:
+    case detail::UNDEFINED_INDEX:
+        writer.null();
+        break;
+    case detail::BOOL_INDEX:
+        writer.boolean(boost::get<bool>(value));
+        break;
+    case detail::DOUBLE_INDEX:
+        writer.number(boost::get<double>(value));
+        break;
+    case detail::STRING_INDEX:
+        writer.string(boost::get<std::string>(value));
+        break;
+    case detail::ARRAY_INDEX:
+        writer.begin_array();
+        for (const Value& item : boost::get<Array>(value)) {
+            emit(item, writer);
+        }
+        writer.end_array();
+        break;
+    case detail::OBJECT_INDEX:
+        writer.begin_object();
+        for (const auto& [key, member] : boost::get<Object>(value)) {
+            if (member.which() != detail::UNDEFINED_INDEX) {
+                writer.key(key);
+                emit(member, writer);
+            }
+        }
+        writer.end_object();
+        break;
+    default:
+        writer.value(value); // a float: its own shortest text
+    }
+}
+
+std::vector<WriteOptions> option_sets() {
+    WriteOptions pretty;
+    pretty.pretty = true;
+    WriteOptions tabs_ascii = pretty;
+    tabs_ascii.indent_with_tab = true;
+    tabs_ascii.ascii_only = true;
+    WriteOptions flat = pretty;
+    flat.indent = 0;
+    flat.pad_empty_containers = false;
+    flat.escape_slash = false;
+    return {WriteOptions(), pretty, COMMON_PRETTY, tabs_ascii, flat};
+}
+
+// Events and value() give serialize's text, onto a string and onto a stream.
+void expect_text_of_serialize(const Value& document) {
+    for (const WriteOptions& options : option_sets()) {
+        const std::string expected = serialize(document, options);
+        std::string by_events = "before:";
+        Writer writer(by_events, options);
+        emit(document, writer);
+        EXPECT_EQ(by_events, "before:" + expected) << "complete without flush()";
+        std::ostringstream stream;
+        Writer onto_stream(stream, options);
+        onto_stream.value(document);
+        EXPECT_TRUE(onto_stream.complete());
+        EXPECT_EQ(stream.str(), expected);
+    }
+}
+
+TEST(Writer, EventsGiveTheTextOfSerialize) {
+    const Value document =
+        Object{{"a", Array{1, Undefined(), "x/y\n", Array{}, Object{{"u", Undefined()}}}},
+               {"b", Object{{"c", true}, {"d", nullptr}, {"\xC3\xA9", 0.5f}}},
+               {"n", Array{NAN, -HUGE_VAL, 1e300, false}},
+               {"u", Undefined()}};
+    expect_text_of_serialize(document);
+    expect_text_of_serialize("top");
+    expect_text_of_serialize(Array{});
+}
+
+#ifdef JSON_DATA_DIR
+TEST(Writer, EventsGiveTheTextOfSerializeOnTheBenchDocuments) {
+    for (const char* name : {"twitter", "citm_catalog", "canada"}) {
+        std::ifstream file(std::string(JSON_DATA_DIR) + "/bench/" + name + ".json");
+        std::ostringstream text;
+        text << file.rdbuf();
+        Value document;
+        ASSERT_EQ(parse(text.str(), document), ParseResult::SUCCESS) << name;
+        expect_text_of_serialize(document);
+        WriteOptions pretty;
+        pretty.pretty = true;
+        EXPECT_EQ(serialize(document, {}), serialize(document));
+        EXPECT_EQ(serialize(document, pretty), pretty_print(document));
+    }
+}
+#endif
+
+// Indentation too long for the stream's buffer to take in one piece goes out in pieces.
+TEST(Writer, LongIndentationOntoAStream) {
+    const Value nested = Array{Array{1}, 2};
+    WriteOptions wide;
+    wide.pretty = true;
+    wide.indent = 9000;
+    std::ostringstream stream;
+    Writer(stream, wide).value(nested);
+    EXPECT_EQ(stream.str(), serialize(nested, wide));
+    EXPECT_EQ(stream.str().size(), 9000 + 18000 + 9000 + 9000 + 12) << "spaces and 12 others";
+}
+
+TEST(Writer, ScalarsAndNumberTexts) {
+    std::string text;
+    Writer writer(text);
+    writer.begin_array();
+    for (const char* literal : {"0", "-0", "-0.5e+3", "12E-07", "1.25", "9007199254740993"}) {
+        EXPECT_TRUE(writer.number(literal));
+    }
+    EXPECT_TRUE(writer.number(NAN));
+    EXPECT_TRUE(writer.number(100000.0));
+    EXPECT_TRUE(writer.value(Undefined()));
+    EXPECT_FALSE(writer.complete());
+    EXPECT_TRUE(writer.end_array());
+    EXPECT_TRUE(writer.complete());
+    EXPECT_EQ(text, R"([0,-0,-0.5e+3,12E-07,1.25,9007199254740993,"NaN",1e+05,null])");
+
+    // Undefined alone at the top level writes nothing, and the value is still to come.
+    std::string top;
+    Writer later(top);
+    EXPECT_TRUE(later.value(Undefined()));
+    EXPECT_FALSE(later.complete());
+    EXPECT_TRUE(later.boolean(false));
+    EXPECT_EQ(top, "false");
+}
+
+// Each call out of place throws and writes nothing; the Writer goes on as if it had not come.
+TEST(Writer, MisuseWritesNothing) {
+    using Call = std::function<void(Writer&)>;
+    const Call open_object = [](Writer& w) { w.begin_object(); };
+    const Call open_array = [](Writer& w) { w.begin_array(); };
+    const Call named = [](Writer& w) {
+        w.begin_object();
+        w.key("a");
+    };
+    const Call done = [](Writer& w) {
+        w.begin_array();
+        w.end_array();
+    };
+    const Call nothing = [](Writer&) {};
+    WriteOptions ascii;
+    ascii.ascii_only = true;
+    const struct {
+        Call before, misuse;
+        bool logic; // std::logic_error, else std::invalid_argument
+        WriteOptions options = {};
+    } rows[] = {
+        {nothing, [](Writer& w) { w.key("a"); }, true},
+        {open_array, [](Writer& w) { w.key("a"); }, true},
+        {named, [](Writer& w) { w.key("b"); }, true},
+        {open_object, [](Writer& w) { w.null(); }, true},
+        {open_object, [](Writer& w) { w.string("v"); }, true},
+        {open_object, [](Writer& w) { w.number(1.0); }, true},
+        {open_object, [](Writer& w) { w.begin_array(); }, true},
+        {open_object, [](Writer& w) { w.value(1); }, true},
+        {open_object, [](Writer& w) { w.end_array(); }, true},
+        {open_array, [](Writer& w) { w.end_object(); }, true},
+        {named, [](Writer& w) { w.end_object(); }, true},
+        {nothing, [](Writer& w) { w.end_array(); }, true},
+        {done, [](Writer& w) { w.boolean(true); }, true},
+        {done, [](Writer& w) { w.begin_object(); }, true},
+        {done, [](Writer& w) { w.value(Undefined()); }, true},
+        {named, [](Writer& w) { w.value(Undefined()); }, false},
+        {open_array, [](Writer& w) { w.string("\xC3"); }, false, ascii},
+        {open_object, [](Writer& w) { w.key("a\x80"); }, false, ascii},
+        {nothing, [](Writer& w) { w.number(""); }, false},
+        {open_array, [](Writer& w) { w.number("01"); }, false},
+        {open_array, [](Writer& w) { w.number("1."); }, false},
+        {open_array, [](Writer& w) { w.number("+1"); }, false},
+        {open_array, [](Writer& w) { w.number("NaN"); }, false},
+        {open_array, [](Writer& w) { w.number(".5"); }, false},
+        {open_array, [](Writer& w) { w.number("1e"); }, false},
+        {open_array, [](Writer& w) { w.number("-"); }, false},
+        {open_array, [](Writer& w) { w.number("1 "); }, false},
+    };
+    for (const auto& row : rows) {
+        std::string text;
+        Writer writer(text, row.options);
+        row.before(writer);
+        writer.flush();
+        const std::string before = text;
+        if (row.logic) {
+            EXPECT_THROW(row.misuse(writer), std::logic_error) << before;
+        } else {
+            EXPECT_THROW(row.misuse(writer), std::invalid_argument) << before;
+        }
+        writer.flush();
+        EXPECT_EQ(text, before);
+    }
+
+    // After a refused call the Writer carries on.
+    std::string text;
+    Writer writer(text);
+    writer.begin_object();
+    EXPECT_THROW(writer.number("1."), std::logic_error);
+    writer.key("k");
+    EXPECT_THROW(writer.number("1."), std::invalid_argument);
+    writer.number("1.5");
+    writer.end_object();
+    EXPECT_EQ(text, R"({"k":1.5})");
+}
+
+// A write that fails part-way leaves the Writer unusable.
+TEST(Writer, FailedWriteLeavesItUnusable) {
+    WriteOptions ascii;
+    ascii.ascii_only = true;
+    std::string text;
+    Writer writer(text, ascii);
+    writer.begin_array();
+    EXPECT_THROW(writer.value(Array{"ok", "\xFF"}), std::invalid_argument);
+    EXPECT_THROW(writer.end_array(), std::logic_error);
+    EXPECT_THROW(writer.null(), std::logic_error);
+}
+
+// Keeps what it is given and counts flushes.
+class CountingBuffer : public std::stringbuf {
+  public:
+    int syncs = 0;
+
+  protected:
+    int sync() override {
+        ++syncs;
+        return 0;
+    }
+};
+
+// Onto a stream: nothing before the top-level value is complete (the text is gathered in a
+// buffer), no flush per line; flush() hands on what is gathered and flushes the stream.
+TEST(Writer, OntoAStream) {
+    CountingBuffer buffer;
+    std::ostream out(&buffer);
+    WriteOptions pretty;
+    pretty.pretty = true;
+    {
+        Writer writer(out, pretty);
+        writer.begin_array();
+        writer.string("a");
+        writer.null();
+        EXPECT_EQ(buffer.str(), "");
+        writer.flush();
+        EXPECT_EQ(buffer.str(), "[\n    \"a\",\n    null");
+        EXPECT_EQ(buffer.syncs, 1);
+        writer.end_array();
+        EXPECT_EQ(buffer.str(), "[\n    \"a\",\n    null\n]");
+        EXPECT_EQ(buffer.syncs, 1);
+        writer.flush();
+        EXPECT_EQ(buffer.syncs, 2);
+    }
+    // What is left when the Writer goes is handed on.
+    buffer.str("");
+    {
+        Writer writer(out);
+        writer.begin_object();
+        writer.key("k");
+    }
+    EXPECT_EQ(buffer.str(), R"({"k":)");
+}
+
+} // namespace
