@@ -1,7 +1,7 @@
 #!/usr/bin/env bash
 # Checks jsonfmt's output, its error messages, its exit codes and the files it writes.
 # Usage: jsonfmt_test.sh JSONFMT [sanitized|plain]
-# "sanitized" skips the bounded-memory case: AddressSanitizer reserves terabytes of address
+# "sanitized" skips the cases under ulimit -v: AddressSanitizer reserves terabytes of address
 # space, which no `ulimit -v` admits.
 set -uo pipefail
 jsonfmt=$1
@@ -65,6 +65,9 @@ bad_error="$work/bad.json:3:4: error: No trailing ']' while parsing value of typ
 	2 3]
 	  ^"
 no_digit="error: Expected leading digit while parsing value of type number (no JSON value starts here)"
+lines_error="$work/bad.jsonl:2:12: $no_digit
+  [true,   x]
+           ^"
 
 expect pretty 0 "$pretty" "" -- "$work/doc.json"
 expect compact 0 "$compact" "" -- -c "$work/doc.json"
@@ -89,30 +92,44 @@ expect version 0 "jsonfmt 0.1.0" "" -- --version
 expect pointer-compact 0 '[1,{}]' "" -- -c -p /b "$work/doc.json"
 expect pointer-pretty 0 $'[\n    1,\n    {    }\n]' "" -- --pointer /b "$work/doc.json"
 expect pointer-empty 0 "$compact" "" -- -c -p "" "$work/doc.json"
-expect pointer-missing 1 '[1,{}]' "$work/other.json: no value at /b: /b: no member \"b\"" -- -c -p /b "$work/other.json" "$work/doc.json"
+expect pointer-missing 1 '[1,{}]' "$work/other.json: no value at /b: no member \"b\"" -- -c -p /b "$work/other.json" "$work/doc.json"
 expect pointer-malformed 2 "" "jsonfmt: --pointer: JSON Pointer \"b\" does not start with '/' (try --help)" -- -p b "$work/doc.json"
 expect pointer-bad-escape 2 "" "jsonfmt: --pointer: JSON Pointer \"/a~2\" has a '~' not followed by '0' or '1' (try --help)" -- -p /a~2 "$work/doc.json"
 
 # --lines: blank lines skipped, the last line has no newline; a bad line gets its own column
 expect lines 0 $'{"a":1}\n[1,2]\n{"b":{"c":3}}\n"last"' "" -- --lines "$work/good.jsonl"
-expect lines-bad 1 $'[1]\n{"b":2}' "$work/bad.jsonl:2:12: $no_digit
-  [true,   x]
-           ^" -- -l "$work/bad.jsonl"
-expect lines-check 1 "" "$work/bad.jsonl:2:12: $no_digit
-  [true,   x]
-           ^" -- -l --check "$work/bad.jsonl"
-expect lines-pointer 1 $'1\n[2]' "$work/pointer.jsonl:2: no value at /b: /b: no member \"b\"" -- -l -p /b "$work/pointer.jsonl"
+expect lines-bad 1 $'[1]\n{"b":2}' "$lines_error" -- -l "$work/bad.jsonl"
+expect lines-check 1 "" "$lines_error" -- -l --check "$work/bad.jsonl"
+# Onto one terminal (here one file), a message comes after the text of the lines before it
+"$jsonfmt" -l "$work/bad.jsonl" >"$work/both" 2>&1
+check lines-in-order [ "$(cat "$work/both")" = $'[1]\n'"$lines_error"$'\n{"b":2}' ]
+expect lines-pointer 1 $'1\n[2]' "$work/pointer.jsonl:2: no value at /b: no member \"b\"" -- -l -p /b "$work/pointer.jsonl"
 
 # --output
 expect output 0 "" "" -- -o "$work/written.json" "$work/doc.json"
 check output-content [ "$(cat "$work/written.json")" = "$pretty" ]
 expect output-long 0 "" "" -- -c --output "$work/written.json" "$work/doc.json"
 check output-long-content [ "$(cat "$work/written.json")" = "$compact" ]
-expect output-unwritable 2 "" "jsonfmt: $work/none/out.json: No such file or directory" -- -o "$work/none/out.json" "$work/doc.json"
+expect output-unwritable 2 "" "jsonfmt: $work/none/out.json: creating a temporary file: No such file or directory" -- -o "$work/none/out.json" "$work/doc.json"
 expect output-full 2 "" "jsonfmt: writing /dev/full: No space left on device" -- -o /dev/full "$work/doc.json"
 expect output-no-file 2 "" "jsonfmt: --output: 1 required FILE missing (try --help)" -- -o
 expect output-is-input 2 "" "jsonfmt: --output $work/./doc.json is also an input: writing it would destroy it (use --in-place) (try --help)" -- -o "$work/./doc.json" "$work/doc.json"
 check output-is-input-kept [ "$(cat "$work/doc.json")" = '{"b": [1, {}], "a": "x/y"}' ]
+# FILE is replaced only when every document is valid and written; a closed standard stream
+# takes no descriptor that the output could get
+printf 'old' >"$work/kept.json"
+expect output-failed-run 1 "" "$bad_error" -- -o "$work/kept.json" "$work/doc.json" "$work/bad.json"
+"$jsonfmt" -o "$work/kept.json" "$work/doc.json" "$work/bad.json" 2>&-
+check output-stderr-closed [ $? = 1 ]
+expect output-stdin-closed 2 "" "jsonfmt: <stdin>: Bad file descriptor" bash -c 'exec "$0" "$@" <&-' -- -o "$work/kept.json"
+check output-failures-kept [ "$(cat "$work/kept.json")" = old ]
+check output-nothing-left [ -z "$(ls -A "$work" | grep jsonfmt-)" ]
+# A new file gets 0666 less the umask, a replaced one keeps its mode
+(umask 027 && "$jsonfmt" -o "$work/new.json" "$work/doc.json")
+check output-new-mode [ "$(stat -c %a "$work/new.json")" = 640 ]
+chmod 604 "$work/new.json"
+expect output-replaced 0 "" "" -- -c -o "$work/new.json" "$work/doc.json"
+check output-replaced-mode [ "$(stat -c %a:%s "$work/new.json")" = 604:24 ]
 
 # --in-place: the rewrite keeps the permission bits; a broken file stays byte for byte; no
 # temporary file (.NAME.jsonfmt-XXXXXX) is left beside either
@@ -137,22 +154,85 @@ expect in-place-dash 2 "" "jsonfmt: --in-place needs files: it cannot rewrite st
 expect in-place-output 2 "" "jsonfmt: --in-place writes back into each FILE: it does not go with --output (try --help)" -- -i -o "$work/out.json" "$work/doc.json"
 expect in-place-pointer 2 "" "jsonfmt: --in-place rewrites whole files: it goes with neither --check nor --pointer (try --help)" -- -i -p /b "$work/doc.json"
 
-# --in-place in a read-only directory; root ignores directory permissions, so as root this
-# runs as nobody
-mkdir "$work/locked"
+# --in-place refuses what a renamed copy would not replace: a file with other hard links, a
+# FIFO (the writer is stopped once the refusal is checked), a pipe behind /dev/stdin
+ln "$work/edit/doc.json" "$work/edit/second-name.json"
+expect in-place-hard-link 2 "" "jsonfmt: $work/edit/doc.json: has 2 hard links: rewriting it would break them" -- -i "$work/edit/doc.json"
+check in-place-hard-link-kept [ "$work/edit/doc.json" -ef "$work/edit/second-name.json" ]
+rm "$work/edit/second-name.json"
+mkfifo "$work/edit/pipe"
+printf '[1]' >"$work/edit/pipe" &
+writer=$!
+expect in-place-fifo 2 "" "jsonfmt: $work/edit/pipe: not a regular file: only a regular file is rewritten" timeout 10 -- -i "$work/edit/pipe"
+check in-place-fifo-kept [ -p "$work/edit/pipe" ]
+kill "$writer" 2>/dev/null; wait "$writer" 2>/dev/null
+rm "$work/edit/pipe"
+printf '[1]' | "$jsonfmt" -i /dev/stdin 2>"$work/err"
+check in-place-dev-stdin-status [ $? = 2 ]
+check in-place-dev-stdin-message [ "$(cat "$work/err")" = "jsonfmt: /dev/stdin: not a regular file: only a regular file is rewritten" ]
+check in-place-refusals-nothing-left same_listing "$work/edit" "$listing"
+
+# A signal while the temporary file is there removes it: jsonfmt is held writing the messages
+# of 3000 bad lines into a pipe that nobody reads
+mkdir "$work/signal"
+yes x | head -n 3000 >"$work/signal/bad.jsonl"
+mkfifo "$work/signal-messages"
+exec 3<>"$work/signal-messages"
+for signal in INT TERM; do
+    env --default-signal="$signal" "$jsonfmt" -l -i "$work/signal/bad.jsonl" 2>&3 &
+    held=$!
+    for _ in $(seq 100); do
+        [ "$(ls -A "$work/signal")" != bad.jsonl ] && break
+        sleep 0.1
+    done
+    kill -"$signal" "$held"
+    wait "$held"
+    check "in-place-$signal-status" [ $? = $((128 + $(kill -l "$signal"))) ]
+    check "in-place-$signal-nothing-left" same_listing "$work/signal" bad.jsonl
+done
+exec 3<&-
+
+# Owner and group are kept (only root can hand a file to another user)
+if [ "$(id -u)" = 0 ]; then
+    cp "$work/doc.json" "$work/edit/owned.json"
+    chown 65534:65534 "$work/edit/owned.json"
+    expect in-place-owner 0 "" "" -- -c -i "$work/edit/owned.json"
+    check in-place-owner-kept [ "$(stat -c %u:%g "$work/edit/owned.json")" = 65534:65534 ]
+    rm "$work/edit/owned.json"
+else
+    skip "in-place-owner: needs root"
+fi
+
+# As an ordinary user (root ignores permissions, so as root this runs as nobody): a read-only
+# directory, where no temporary file can be made; a read-only file; and a file of another user
+# that nobody may write, but whose owner the rewrite could not keep
+mkdir "$work/locked" "$work/mine"
 cp "$work/doc.json" "$work/locked/doc.json"
-chmod 644 "$work/locked/doc.json"
-chmod 555 "$work/locked"
+cp "$work/doc.json" "$work/mine/read-only.json"
+chmod 444 "$work/mine/read-only.json"
+cp "$work/doc.json" "$work/mine/others.json"
+chmod 666 "$work/mine/others.json"
 unprivileged=()
-if [ "$(id -u)" = 0 ]; then unprivileged=(setpriv --reuid=65534 --regid=65534 --clear-groups); fi
+if [ "$(id -u)" = 0 ]; then
+    unprivileged=(setpriv --reuid=65534 --regid=65534 --clear-groups)
+    chown 65534:65534 "$work/locked/doc.json" "$work/mine" "$work/mine/read-only.json"
+fi
+chmod 555 "$work/locked"
 if [ "${#unprivileged[@]}" -ne 0 ] && ! command -v setpriv >/dev/null; then
-    skip "in-place-read-only-dir: running as root without setpriv"
+    skip "in-place-read-only: running as root without setpriv"
 elif ! "${unprivileged[@]}" test -r "$work/locked/doc.json"; then
-    skip "in-place-read-only-dir: $work is out of the unprivileged user's reach"
+    skip "in-place-read-only: $work is out of the unprivileged user's reach"
 else
     expect in-place-read-only-dir 2 "" "jsonfmt: $work/locked/doc.json: creating a temporary file: Permission denied" "${unprivileged[@]}" -- -i "$work/locked/doc.json"
     check in-place-read-only-unchanged cmp -s "$work/doc.json" "$work/locked/doc.json"
     check in-place-read-only-nothing-left same_listing "$work/locked" doc.json
+    expect in-place-read-only-file 2 "" "jsonfmt: $work/mine/read-only.json: Permission denied" "${unprivileged[@]}" -- -i "$work/mine/read-only.json"
+    check in-place-read-only-file-unchanged cmp -s "$work/doc.json" "$work/mine/read-only.json"
+    if [ "${#unprivileged[@]}" -ne 0 ]; then
+        expect in-place-foreign-owner 2 "" "jsonfmt: $work/mine/others.json: keeping its owner and group: Operation not permitted" "${unprivileged[@]}" -- -i "$work/mine/others.json"
+        check in-place-foreign-owner-kept [ "$(stat -c %u "$work/mine/others.json")" = 0 ]
+    fi
+    check in-place-refused-nothing-left same_listing "$work/mine" $'others.json\nread-only.json'
 fi
 
 # A full device: the failed write is an error, for documents and for --help and --version alike
@@ -170,13 +250,20 @@ check nul-context cmp "$work/nul.expected" "$work/err"
 # Bounded memory: a 1 MB document nested 500 deep pretty-prints to 1.3 GB within 300 MB of
 # address space, the output streaming out as it is made
 if [ "$mode" = sanitized ]; then
-    skip "bounded-memory: AddressSanitizer's reservations exceed any ulimit -v"
+    skip "bounded-memory, lines-out-of-memory: AddressSanitizer's reservations exceed any ulimit -v"
 else
     { head -c 500 /dev/zero | tr '\0' '['; yes '[1,2],' | head -n 166000 | tr -d '\n' | head -c -1
       head -c 500 /dev/zero | tr '\0' ']'; } >"$work/big.json"
     bytes=$(ulimit -v 300000 && "$jsonfmt" "$work/big.json" | wc -c)
     check bounded-memory-status [ $? = 0 ]
     check bounded-memory-bytes [ "$bytes" = 1331987999 ]
+    # A line longer than memory allows: "out of memory", and the file stays as it was
+    { printf '[1]\n"'; head -c 30000000 /dev/zero | tr '\0' x; printf '"\n[2]\n'; } >"$work/long.jsonl"
+    mkdir "$work/long"
+    cp "$work/long.jsonl" "$work/long/long.jsonl"
+    expect lines-out-of-memory 2 "" "jsonfmt: $work/long/long.jsonl: out of memory" bash -c 'ulimit -v 30000 && exec "$0" "$@"' -- -l -c -i "$work/long/long.jsonl"
+    check lines-out-of-memory-kept cmp -s "$work/long.jsonl" "$work/long/long.jsonl"
+    check lines-out-of-memory-nothing-left same_listing "$work/long" long.jsonl
 fi
 
 # --help names every option

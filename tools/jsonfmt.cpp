@@ -15,11 +15,12 @@
 #include <fcntl.h>
 #include <new>
 #include <ostream>
+#include <stdexcept>
 #include <string>
 #include <string_view>
 #include <sys/stat.h>
-#include <system_error>
 #include <unistd.h>
+#include <utility>
 #include <vector>
 
 namespace {
@@ -99,8 +100,9 @@ void show_failure_line(std::string_view text, const json::ParseReport& report) {
 // Writes parsed documents, or the values at the pointer, onto one output.
 class Writer {
   public:
-    Writer(const Settings& settings, int descriptor)
-        : settings(settings), buffer(descriptor), stream(&buffer) {
+    Writer(const Settings& settings, int descriptor, std::string destination)
+        : settings(settings), destination(std::move(destination)), buffer(descriptor),
+          stream(&buffer) {
         serializer.pretty_print(!settings.compact && !settings.lines);
     }
 
@@ -112,8 +114,9 @@ class Writer {
             try {
                 value = &document.at_pointer(settings.pointer);
             } catch (const std::out_of_range& error) {
-                std::fprintf(stderr, "%s: no value at %s: %s\n", where.c_str(),
-                             settings.pointer.c_str(), error.what());
+                // The message starts with the pointer, up to the first step not found.
+                flush();
+                std::fprintf(stderr, "%s: no value at %s\n", where.c_str(), error.what());
                 return INVALID;
             }
         }
@@ -124,8 +127,12 @@ class Writer {
         return VALID;
     }
 
+    // Hands on what is written so far, so that a message that follows comes after it where
+    // both go to one terminal. A failure is kept for finish() to report.
+    void flush() { buffer.finish(); }
+
     // Hands everything written on; false (after saying why) when writing failed.
-    bool finish(const std::string& destination) {
+    bool finish() {
         if (!buffer.finish() || !stream) {
             complain("writing " + destination + ": " + std::strerror(buffer.error()));
             return false;
@@ -135,13 +142,15 @@ class Writer {
 
   private:
     const Settings& settings;
+    std::string destination;
     jsonfmt::DescriptorBuffer buffer;
     std::ostream stream;
     json::Serializer serializer;
 };
 
 ExitStatus report_parse_failure(const std::string& where, std::string_view text,
-                                const json::ParseReport& report, std::size_t line) {
+                                const json::ParseReport& report, std::size_t line, Writer& writer) {
+    writer.flush();
     std::fprintf(stderr, "%s:%zu:%zu: error: %s\n", where.c_str(), line + report.line - 1,
                  report.column, report.message().c_str());
     show_failure_line(text, report);
@@ -162,7 +171,7 @@ ExitStatus format_document(const std::string& name, const std::string& shown_nam
     json::Value document;
     const json::ParseReport report = json::parse(text, document, settings.parse_options);
     if (!report) {
-        return report_parse_failure(shown_name, text, report, 1);
+        return report_parse_failure(shown_name, text, report, 1, writer);
     }
     return writer.write(document, shown_name);
 }
@@ -200,10 +209,17 @@ ExitStatus format_lines(const std::string& name, const std::string& shown_name,
         json::Value document;
         const json::ParseReport report = json::parse(text, document, settings.parse_options);
         const std::string where = shown_name + ":" + std::to_string(number);
-        status = std::max(status, report ? writer.write(document, where)
-                                         : report_parse_failure(shown_name, text, report, number));
+        status = std::max(status,
+                          report ? writer.write(document, where)
+                                 : report_parse_failure(shown_name, text, report, number, writer));
     }
-    if (std::ferror(input.file) != 0) {
+    // getline returns -1 at the end of the file and on a failure alike: only the end sets the
+    // end-of-file flag. Running out of memory for a long line sets no flag at all, only errno.
+    if (std::feof(input.file) == 0) {
+        if (errno == ENOMEM) {
+            throw std::bad_alloc();
+        }
+        writer.flush();
         complain(shown_name + ": " + std::strerror(errno));
         return TROUBLE;
     }
@@ -221,30 +237,54 @@ ExitStatus format_file(const std::string& name, const Settings& settings, Writer
     }
 }
 
-// Rewrites `name` with its formatted text; the original stays as it was unless every step
-// succeeds.
-ExitStatus rewrite_in_place(const std::string& name, const Settings& settings) {
-    try {
-        jsonfmt::Replacement replacement(name);
-        ExitStatus status = VALID;
-        {
-            Writer writer(settings, replacement.descriptor());
-            status = format_file(name, settings, writer);
-            if (status == VALID && !writer.finish(name)) {
-                status = TROUBLE;
-            }
+// Formats each of `files` onto `descriptor`, handing each file's text on before the next
+// file's messages.
+ExitStatus format_files(const std::vector<std::string>& files, const Settings& settings,
+                        int descriptor, const std::string& destination) {
+    Writer writer(settings, descriptor, destination);
+    ExitStatus status = VALID;
+    for (const std::string& name : files) {
+        status = std::max(status, format_file(name, settings, writer));
+        if (!writer.finish()) {
+            return TROUBLE;
         }
+    }
+    return status;
+}
+
+// Replaces `target` with the formatted text of `files`, only when every document is valid and
+// written: otherwise the target stays as it was.
+ExitStatus replace(const std::string& target, jsonfmt::Replacement::Target kind,
+                   const std::vector<std::string>& files, const Settings& settings) {
+    try {
+        jsonfmt::Replacement replacement(target, kind);
+        const ExitStatus status = format_files(files, settings, replacement.descriptor(), target);
         if (status == VALID) {
             replacement.commit();
         }
         return status;
-    } catch (const std::system_error& error) {
+    } catch (const std::runtime_error& error) { // a refusal, or a failing system call
         complain(error.what());
         return TROUBLE;
     } catch (const std::bad_alloc&) {
-        complain(name + ": out of memory");
+        complain(target + ": out of memory");
         return TROUBLE;
     }
+}
+
+// Writes into a file that is not replaced but written as it is: a device, a FIFO.
+ExitStatus write_special_file(const std::string& name, const Settings& settings) {
+    const int descriptor = ::open(name.c_str(), O_WRONLY | O_CLOEXEC);
+    if (descriptor < 0) {
+        complain(name + ": " + std::strerror(errno));
+        return TROUBLE;
+    }
+    ExitStatus status = format_files(settings.files, settings, descriptor, name);
+    if (::close(descriptor) != 0) {
+        complain("writing " + name + ": " + std::strerror(errno));
+        status = TROUBLE;
+    }
+    return status;
 }
 
 // Writes what a --help or --version call printed; a failed write is trouble like any other.
@@ -353,43 +393,43 @@ bool read_arguments(int argc, char** argv, Settings& settings, int& status) {
 }
 
 int run(const Settings& settings) {
-    int status = VALID;
+    using Target = jsonfmt::Replacement::Target;
     if (settings.in_place) {
+        ExitStatus status = VALID;
         for (const std::string& name : settings.files) {
-            status = std::max<int>(status, rewrite_in_place(name, settings));
+            status = std::max(status, replace(name, Target::EXISTING, {name}, settings));
         }
         return status;
     }
-    int descriptor = STDOUT_FILENO;
-    std::string destination = "standard output";
-    if (!settings.output_path.empty() && !settings.check_only) {
-        descriptor =
-            ::open(settings.output_path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
-        if (descriptor < 0) {
-            complain(settings.output_path + ": " + std::strerror(errno));
-            return TROUBLE;
+    if (settings.output_path.empty() || settings.check_only) {
+        return format_files(settings.files, settings, STDOUT_FILENO, "standard output");
+    }
+    if (jsonfmt::is_special_file(settings.output_path)) {
+        return write_special_file(settings.output_path, settings);
+    }
+    return replace(settings.output_path, Target::EXISTING_OR_NEW, settings.files, settings);
+}
+
+// Opens /dev/null on each of descriptors 0 to 2 that is closed, so that no file this program
+// opens takes one of them (a diagnostic would land in the output file). Opened the other way
+// round (standard input for writing only, the outputs for reading only), so that reading or
+// writing a closed standard stream still fails as it did. False when /dev/null does not open.
+bool occupy_standard_descriptors() {
+    for (int descriptor = STDIN_FILENO; descriptor <= STDERR_FILENO; ++descriptor) {
+        if (::fcntl(descriptor, F_GETFD) < 0 &&
+            ::open("/dev/null", descriptor == STDIN_FILENO ? O_WRONLY : O_RDONLY) != descriptor) {
+            return false;
         }
-        destination = settings.output_path;
     }
-    Writer writer(settings, descriptor);
-    for (const std::string& name : settings.files) {
-        status = std::max<int>(status, format_file(name, settings, writer));
-        // Each file's text goes out before the next file's messages.
-        if (!writer.finish(destination)) {
-            status = TROUBLE;
-            break;
-        }
-    }
-    if (descriptor != STDOUT_FILENO && ::close(descriptor) != 0) {
-        complain("writing " + destination + ": " + std::strerror(errno));
-        status = TROUBLE;
-    }
-    return status;
+    return true;
 }
 
 } // namespace
 
 int main(int argc, char** argv) {
+    if (!occupy_standard_descriptors()) {
+        return TROUBLE;
+    }
     try {
         Settings settings;
         int status = VALID;
