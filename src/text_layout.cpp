@@ -8,6 +8,7 @@
 #include <limits>
 #include <stdexcept>
 #include <string>
+#include <type_traits>
 
 namespace json::detail {
 
@@ -53,6 +54,16 @@ std::size_t text_length(const char* text) {
     return length;
 }
 
+#if defined(__SSE2__)
+// Whether no byte of the two eight-byte pieces needs an escape.
+template <bool EscapeSlash, bool EscapeHigh>
+bool pieces_are_plain(std::uint64_t head, std::uint64_t tail) {
+    const __m128i bytes =
+        _mm_set_epi64x(static_cast<long long>(tail), static_cast<long long>(head));
+    return special_bytes_in<EscapeSlash, EscapeHigh>(bytes) == 0;
+}
+#endif
+
 } // namespace
 
 TextLayout::TextLayout(OutputBuffer& buffer, const WriteOptions& options)
@@ -63,10 +74,7 @@ TextLayout::TextLayout(OutputBuffer& buffer, const WriteOptions& options)
                                    : (options.ascii_only ? Escapes::high : Escapes::none)),
       colon{':', ' '}, colon_size(options.space_after_colon ? 2 : 1) {}
 
-void TextLayout::check_string(std::string_view text) const {
-    if (escapes != Escapes::slash_and_high && escapes != Escapes::high) {
-        return;
-    }
+void TextLayout::check_utf8(std::string_view text) {
     const char* const end = text.data() + text.size();
     for (const char* at = text.data(); at != end; ++at) {
         // Stops at a byte to escape, which is fine, or at an ill-formed one.
@@ -80,22 +88,102 @@ void TextLayout::check_string(std::string_view text) const {
     }
 }
 
-void TextLayout::quoted_with_other_escapes(std::string_view text, bool sixteen_readable,
-                                           std::size_t colon_count) {
+// Calls `write` with the escape set as two std::bool_constant arguments: the slash, and the
+// bytes from 0x80 up.
+template <typename Write>
+void TextLayout::with_escapes(Write&& write) {
     switch (escapes) {
     case Escapes::slash:
-        quoted<true, false>(text, sixteen_readable, colon_count);
+        write(std::true_type(), std::false_type());
         break;
     case Escapes::slash_and_high:
-        quoted<true, true>(text, sixteen_readable, colon_count);
+        write(std::true_type(), std::true_type());
         break;
     case Escapes::none:
-        quoted<false, false>(text, sixteen_readable, colon_count);
+        write(std::false_type(), std::false_type());
         break;
     case Escapes::high:
-        quoted<false, true>(text, sixteen_readable, colon_count);
+        write(std::false_type(), std::true_type());
         break;
     }
+}
+
+void TextLayout::quoted_with_other_escapes(const std::string& text, std::size_t colon_count) {
+    with_escapes([&](auto slash, auto high) {
+        quoted<decltype(slash)::value, decltype(high)::value>(text, colon_count);
+    });
+}
+
+void TextLayout::quoted_in_bounds(std::string_view text, std::size_t colon_count) {
+    with_escapes([&](auto slash, auto high) {
+        constexpr bool escape_slash = decltype(slash)::value;
+        constexpr bool escape_high = decltype(high)::value;
+        if (text.size() >= SHORT_SIZE ||
+            !quoted_short_in_bounds<escape_slash, escape_high>(text, colon_count)) {
+            escaped<escape_slash, escape_high>(text, colon_count);
+        }
+    });
+}
+
+// Its bytes
+// are loaded and stored as two pieces that overlap (eight bytes each from eight on, four
+// from four on, else the first, middle and last byte), which together cover every byte, so
+// the check sees the string's bytes only and no call to memcpy is made for a few bytes.
+template <bool EscapeSlash, bool EscapeHigh>
+bool TextLayout::quoted_short_in_bounds(std::string_view text, std::size_t colon_count) {
+#if defined(__SSE2__)
+    const char* const from = text.data();
+    const std::size_t size = text.size();
+    if (size >= 8) {
+        std::uint64_t head = 0;
+        std::uint64_t tail = 0;
+        std::memcpy(&head, from, 8);
+        std::memcpy(&tail, from + size - 8, 8);
+        if (!pieces_are_plain<EscapeSlash, EscapeHigh>(head, tail)) {
+            return false;
+        }
+        char* const out = start_short();
+        std::memcpy(out + 1, &head, 8);
+        std::memcpy(out + 1 + size - 8, &tail, 8);
+        end_short(out, size, colon_count);
+    } else if (size >= 4) {
+        std::uint32_t head = 0;
+        std::uint32_t tail = 0;
+        std::memcpy(&head, from, 4);
+        std::memcpy(&tail, from + size - 4, 4);
+        const std::uint64_t both = head | std::uint64_t{tail} << 32U;
+        if (!pieces_are_plain<EscapeSlash, EscapeHigh>(both, both)) {
+            return false;
+        }
+        char* const out = start_short();
+        std::memcpy(out + 1, &head, 4);
+        std::memcpy(out + 1 + size - 4, &tail, 4);
+        end_short(out, size, colon_count);
+    } else if (size != 0) {
+        const char first = from[0];
+        const char middle = from[size / 2];
+        const char last = from[size - 1];
+        const auto lane = [](char c) { return std::uint64_t{static_cast<unsigned char>(c)}; };
+        // The first byte in every lane but the second and third: the middle and the last.
+        const std::uint64_t all = (lane(first) * 0x0101010101010101U & ~std::uint64_t{0xFFFF00}) |
+                                  lane(middle) << 8U | lane(last) << 16U;
+        if (!pieces_are_plain<EscapeSlash, EscapeHigh>(all, all)) {
+            return false;
+        }
+        char* const out = start_short();
+        out[1] = first;
+        out[1 + size / 2] = middle;
+        out[size] = last;
+        end_short(out, size, colon_count);
+    } else {
+        return false;
+    }
+    return true;
+#else
+    static_cast<void>(text);
+    static_cast<void>(colon_count);
+    return false;
+#endif
 }
 
 template <bool EscapeSlash, bool EscapeHigh>
@@ -138,8 +226,10 @@ void TextLayout::escaped(std::string_view text, std::size_t colon_count) {
         run = byte + 1;
     }
     buffer.put('"');
-    for (std::size_t at = 0; at != colon_count; ++at) {
-        buffer.put(colon[at]);
+    if (colon_count != 0) {
+        char* const out = buffer.reserve(sizeof colon);
+        std::memcpy(out, colon, sizeof colon);
+        buffer.commit(out + colon_count);
     }
 }
 

@@ -7,6 +7,7 @@
 #include <json/serializer.hpp>
 
 #include <cstddef>
+#include <cstdint>
 #include <cstring>
 #include <string_view>
 
@@ -38,18 +39,21 @@ class TextLayout {
     /// A number's text as it is (the caller has checked that it is one).
     void number_text(std::string_view text) { buffer.append(text.data(), text.size()); }
 
-    /// `text` quoted and escaped. `sixteen_readable`: sixteen bytes may be read at text.data()
-    /// (as in a std::string whose capacity is at least 15), which lets a short string be
-    /// checked and copied in one piece. Throws std::invalid_argument where check_string does,
-    /// after writing part of the string.
-    void string(std::string_view text, bool sixteen_readable) { quoted(text, sixteen_readable, 0); }
+    /// `text` quoted and escaped. Throws std::invalid_argument where check_string does, after
+    /// writing part of the string.
+    void string(const std::string& text) { quoted(text, 0); }
+    /// The same for text of which nothing past its end may be read.
+    void string(std::string_view text) { quoted_in_bounds(text, 0); }
     /// A member name as string() writes it, and its colon.
-    void member_name(std::string_view name, bool sixteen_readable) {
-        quoted(name, sixteen_readable, colon_size);
-    }
+    void member_name(const std::string& name) { quoted(name, colon_size); }
+    void member_name(std::string_view name) { quoted_in_bounds(name, colon_size); }
     /// Throws std::invalid_argument, naming the offset of the first offending byte, when the
     /// text must be ASCII and `text` is not well-formed UTF-8, so cannot be written. Linear.
-    void check_string(std::string_view text) const;
+    void check_string(std::string_view text) const {
+        if (escapes == Escapes::slash_and_high || escapes == Escapes::high) {
+            check_utf8(text);
+        }
+    }
 
     /// The opening bracket of a container: '[' or '{'.
     void open(char bracket) { buffer.put(bracket); }
@@ -92,35 +96,61 @@ class TextLayout {
 
     // The quoted string, then the first `colon_count` bytes of the colon (0 for a string). The
     // library's own escapes are dispatched to inline; the other sets out of line.
-    void quoted(std::string_view text, bool sixteen_readable, std::size_t colon_count) {
+    void quoted(const std::string& text, std::size_t colon_count) {
         if (escapes == Escapes::slash) {
-            quoted<true, false>(text, sixteen_readable, colon_count);
+            quoted<true, false>(text, colon_count);
         } else {
-            quoted_with_other_escapes(text, sixteen_readable, colon_count);
+            quoted_with_other_escapes(text, colon_count);
         }
     }
 
-    void quoted_with_other_escapes(std::string_view text, bool sixteen_readable,
-                                   std::size_t colon_count);
+    void quoted_with_other_escapes(const std::string& text, std::size_t colon_count);
+
+    static constexpr std::size_t SHORT_SIZE = 16;
 
     template <bool EscapeSlash, bool EscapeHigh>
-    void quoted(std::string_view text, bool sixteen_readable, std::size_t colon_count) {
-        constexpr std::size_t short_size = 16;
-        if (text.size() < short_size && sixteen_readable &&
+    void quoted(const std::string& text, std::size_t colon_count) {
+        // Most keys and many values: a short string with nothing to escape. A std::string holds
+        // at least sixteen readable bytes (its capacity and the NUL) from a capacity of fifteen
+        // on; all sixteen are copied at once and only the string's own are kept.
+        if (text.size() < SHORT_SIZE && text.capacity() >= SHORT_SIZE - 1 &&
             short_run_is_plain<EscapeSlash, EscapeHigh>(text.data(), text.size())) {
-            // Most keys and many values: a short string with nothing to escape. All sixteen
-            // bytes are copied at once and only the string's own are kept; both bytes of the
-            // colon too, of which a member name keeps its own.
-            char* const out = buffer.reserve(short_size + 4);
-            out[0] = '"';
-            std::memcpy(out + 1, text.data(), short_size);
-            out[1 + text.size()] = '"';
-            std::memcpy(out + 2 + text.size(), colon, sizeof colon);
-            buffer.commit(out + 2 + text.size() + colon_count);
+            char* const out = start_short();
+            std::memcpy(out + 1, text.data(), SHORT_SIZE);
+            end_short(out, text.size(), colon_count);
             return;
         }
+        // Out of line, so that the path above stays small enough to be inlined.
         escaped<EscapeSlash, EscapeHigh>(text, colon_count);
     }
+
+    // quoted() for text of which nothing past its end may be read.
+    void quoted_in_bounds(std::string_view text, std::size_t colon_count);
+
+    // Room for a short string's quotes and colon, its opening quote written.
+    char* start_short() {
+        char* const out = buffer.reserve(SHORT_SIZE + 4);
+        out[0] = '"';
+        return out;
+    }
+
+    // The closing quote after a short string written at out + 1; both bytes of the colon are
+    // copied, and a member name keeps its own.
+    void end_short(char* out, std::size_t size, std::size_t colon_count) {
+        out[1 + size] = '"';
+        std::memcpy(out + 2 + size, colon, sizeof colon);
+        buffer.commit(out + 2 + size + colon_count);
+    }
+
+    // A string of one to fifteen bytes of which no more may be read, written whole when nothing
+    // in it needs an escape; otherwise (or when empty) false, with nothing written.
+    template <bool EscapeSlash, bool EscapeHigh>
+    bool quoted_short_in_bounds(std::string_view text, std::size_t colon_count);
+
+    template <typename Write>
+    void with_escapes(Write&& write);
+
+    static void check_utf8(std::string_view text);
 
     // quoted()'s general case: a string of any length, its escapes written out.
     template <bool EscapeSlash, bool EscapeHigh>

@@ -7,12 +7,6 @@ namespace json::detail {
 
 namespace {
 
-// A std::string holds at least sixteen readable bytes (its capacity plus the NUL) from a
-// capacity of fifteen on, which the layout's short-string path may read whole.
-bool sixteen_readable(const std::string& text) {
-    return text.capacity() >= 15;
-}
-
 // Writes a scalar alternative; containers are handed back to the caller's walk.
 class ScalarWriter : public boost::static_visitor<void> {
   public:
@@ -23,7 +17,7 @@ class ScalarWriter : public boost::static_visitor<void> {
     void operator()(bool boolean) const { layout.boolean(boolean); }
     void operator()(double number) const { layout.number(number); }
     void operator()(float number) const { layout.number(number); }
-    void operator()(const std::string& text) const { layout.string(text, sixteen_readable(text)); }
+    void operator()(const std::string& text) const { layout.string(text); }
     void operator()(const Array&) const {}
     void operator()(const Object&) const {}
 
@@ -92,13 +86,13 @@ class ContainerWriter {
         layout.start_entry(frame.empty, frame.level);
         frame.empty = false;
         const auto& [key, value] = *frame.member++;
-        layout.member_name(key, sixteen_readable(key));
+        layout.member_name(key);
         return &value;
     }
 
     // An element or member value at `level`: containers are opened here and finished by the
     // loop; an Undefined element stands as null so that the array stays valid JSON.
-    void write_entry(const Value& value, std::size_t level) {
+    __attribute__((always_inline)) void write_entry(const Value& value, std::size_t level) {
         switch (value.which()) {
         case ARRAY_INDEX:
             write_container(boost::get<Array>(value), level);

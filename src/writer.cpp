@@ -129,7 +129,7 @@ class Writer::State {
 
     void key(std::string_view name) {
         start_entry();
-        layout.member_name(name, false);
+        layout.member_name(name);
         member_value_due = true;
     }
 
@@ -246,7 +246,7 @@ bool Writer::string(std::string_view utf8) {
     state->layout.check_string(utf8);
     return state->write([this, utf8] {
         state->start_value();
-        state->layout.string(utf8, false);
+        state->layout.string(utf8);
         state->end_value();
     });
 }

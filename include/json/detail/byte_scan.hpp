@@ -24,10 +24,9 @@ constexpr bool is_special_byte(unsigned char byte) {
 }
 
 #if defined(__SSE2__)
-/// Bit i is set when byte i of the sixteen at `from` needs attention (see is_special_byte).
+/// Bit i is set when byte i of `bytes` needs attention (see is_special_byte).
 template <bool WithSlash, bool WithHigh = false>
-inline int special_bytes_of_16(const char* from) noexcept {
-    const __m128i bytes = _mm_loadu_si128(reinterpret_cast<const __m128i*>(from));
+inline int special_bytes_in(__m128i bytes) noexcept {
     // Unsigned min(byte, 0x1F) == byte exactly for the bytes below 0x20.
     const __m128i control = _mm_cmpeq_epi8(_mm_min_epu8(bytes, _mm_set1_epi8(0x1F)), bytes);
     // Without the slash, its comparison repeats the quote's: one shape for both scans.
@@ -38,6 +37,13 @@ inline int special_bytes_of_16(const char* from) noexcept {
     const int hits = _mm_movemask_epi8(_mm_or_si128(control, special));
     // The sign bit of each byte is the byte's own high bit.
     return WithHigh ? hits | _mm_movemask_epi8(bytes) : hits;
+}
+
+/// Bit i is set when byte i of the sixteen at `from` needs attention (see is_special_byte).
+template <bool WithSlash, bool WithHigh = false>
+inline int special_bytes_of_16(const char* from) noexcept {
+    return special_bytes_in<WithSlash, WithHigh>(
+        _mm_loadu_si128(reinterpret_cast<const __m128i*>(from)));
 }
 #endif
 
