@@ -2,6 +2,9 @@
 // documents: compact and pretty writing into a std::string, parsing into the document model,
 // deep copying, destruction, and the heap held by a parsed document. simdjson takes part in
 // parsing and compact writing only: its DOM is read-only, so there is nothing to copy.
+// jsonvalue's own writing with the common two-space layout, and its event writer against
+// RapidJSON's, both fed the events of one walk over a parsed jsonvalue document, are measured
+// too.
 #include <json/json.hpp>
 
 #include <benchmark/benchmark.h>
@@ -20,6 +23,7 @@
 #include <sstream>
 #include <stdexcept>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace {
@@ -188,6 +192,79 @@ struct SimdJson {
     }
 };
 
+// Hands `handler` the events of a walk over `value`, members in key order (the benchmark
+// documents hold no Undefined and no float).
+template <typename Handler>
+void walk(const json::Value& value, Handler& handler) {
+    switch (value.which()) {
+    case json::detail::NULL_INDEX:
+        handler.null();
+        break;
+    case json::detail::BOOL_INDEX:
+        handler.boolean(boost::get<bool>(value));
+        break;
+    case json::detail::DOUBLE_INDEX:
+        handler.number(boost::get<double>(value));
+        break;
+    case json::detail::STRING_INDEX:
+        handler.string(boost::get<std::string>(value));
+        break;
+    case json::detail::ARRAY_INDEX:
+        handler.begin_array();
+        for (const json::Value& item : boost::get<json::Array>(value)) {
+            walk(item, handler);
+        }
+        handler.end_array();
+        break;
+    case json::detail::OBJECT_INDEX:
+        handler.begin_object();
+        for (const auto& [key, member] : boost::get<json::Object>(value)) {
+            handler.key(key);
+            walk(member, handler);
+        }
+        handler.end_object();
+        break;
+    default:
+        throw std::runtime_error("a benchmark document holds Undefined or a float");
+    }
+}
+
+// RapidJSON's Writer under the event names of json::Writer.
+class RapidJsonEvents {
+  public:
+    explicit RapidJsonEvents(rapidjson::StringBuffer& buffer) : writer(buffer) {}
+    void null() { writer.Null(); }
+    void boolean(bool value) { writer.Bool(value); }
+    void number(double value) { writer.Double(value); }
+    void string(std::string_view text) {
+        writer.String(text.data(), static_cast<rapidjson::SizeType>(text.size()));
+    }
+    void key(std::string_view text) {
+        writer.Key(text.data(), static_cast<rapidjson::SizeType>(text.size()));
+    }
+    void begin_array() { writer.StartArray(); }
+    void end_array() { writer.EndArray(); }
+    void begin_object() { writer.StartObject(); }
+    void end_object() { writer.EndObject(); }
+
+  private:
+    rapidjson::Writer<rapidjson::StringBuffer> writer;
+};
+
+std::string write_events_with_jsonvalue(const json::Value& document) {
+    std::string text;
+    json::Writer writer(text);
+    walk(document, writer);
+    return text;
+}
+
+std::string write_events_with_rapidjson(const json::Value& document) {
+    rapidjson::StringBuffer buffer;
+    RapidJsonEvents events(buffer);
+    walk(document, events);
+    return std::string(buffer.GetString(), buffer.GetSize());
+}
+
 std::string read_file(const std::string& path) {
     std::ifstream file(path, std::ios::binary);
     if (!file) {
@@ -267,6 +344,26 @@ void register_library(const std::string& document_name, const std::string& text)
     }
 }
 
+// jsonvalue's writing with the common two-space layout, and the two event writers fed by a
+// walk over one parsed jsonvalue document.
+void register_layouts_and_events(const std::string& document_name, const std::string& text) {
+    const std::shared_ptr<const json::Value> parsed = JsonValue::parse(text);
+    const auto add = [&](const std::string& operation, const std::string& library,
+                         std::string (*write)(const json::Value&)) {
+        const std::string name = operation + "/" + document_name + "/" + library;
+        benchmark::RegisterBenchmark(name.c_str(), [parsed, text, write](auto& state) {
+            for (auto _ : state) {
+                benchmark::DoNotOptimize(write(*parsed));
+            }
+            count_bytes(state, text);
+        });
+    };
+    add("common", "jsonvalue",
+        [](const json::Value& document) { return json::serialize(document, json::COMMON_PRETTY); });
+    add("events", "jsonvalue", write_events_with_jsonvalue);
+    add("events", "rapidjson", write_events_with_rapidjson);
+}
+
 } // namespace
 
 int main(int argc, char** argv) {
@@ -279,6 +376,7 @@ int main(int argc, char** argv) {
         register_library<RapidJson>(name, text);
         register_library<BoostJson>(name, text);
         register_library<SimdJson>(name, text);
+        register_layouts_and_events(name, text);
     }
     benchmark::RunSpecifiedBenchmarks();
     benchmark::Shutdown();

@@ -1,17 +1,21 @@
 #!/usr/bin/env python3
-"""Prints two tables from the medians of one run of json_bench (Google Benchmark's JSON
+"""Prints three tables from the medians of one run of json_bench (Google Benchmark's JSON
 output). The first gives, for each document and operation, jsonvalue's throughput and the
 ratio of its throughput to each peer's (above 1.0: jsonvalue is faster). The second gives, for
 each operation and peer, the geometric mean of that ratio over the documents and the worst
 document's ratio. For memory, the ratio is the peer's heap divided by jsonvalue's (above 1.0:
-jsonvalue holds less). A peer without the operation shows "-"."""
+jsonvalue holds less). A peer without the operation shows "-". The third compares jsonvalue's
+operations with each other: the common two-space layout against its own pretty text, and the
+event writer against serialize."""
 import json
 import math
 import sys
 
 PEERS = [("nlohmann", "nlohmann"), ("jsoncpp", "jsoncpp"), ("rapidjson", "RapidJSON"),
          ("boostjson", "Boost.JSON"), ("simdjson", "simdjson")]
-OPERATIONS = ["compact", "pretty", "parse", "copy", "destroy", "memory"]
+OPERATIONS = ["compact", "pretty", "events", "parse", "copy", "destroy", "memory"]
+# jsonvalue against itself: (operation, the operation it is measured against).
+OWN_RATIOS = [("common", "pretty"), ("events", "compact")]
 DOCUMENTS = ["twitter", "citm_catalog", "canada"]
 
 
@@ -69,6 +73,17 @@ def main():
             mean = math.exp(sum(math.log(value) for value in ratios) / len(ratios))
             cells.append(f"{mean:.2f} (worst {min(ratios):.2f})")
         print(f"| {operation} | " + " | ".join(cells) + " |")
+
+    print()
+    print("| document | " + " | ".join(f"{a} / {b}" for a, b in OWN_RATIOS) + " |")
+    print("|---|" + "---|" * len(OWN_RATIOS))
+    for document in DOCUMENTS:
+        cells = []
+        for operation, reference in OWN_RATIOS:
+            ours = values.get(f"{operation}/{document}/jsonvalue")
+            theirs = values.get(f"{reference}/{document}/jsonvalue")
+            cells.append("-" if ours is None or theirs is None else f"{ours / theirs:.2f}")
+        print(f"| {document} | " + " | ".join(cells) + " |")
 
 
 if __name__ == "__main__":
