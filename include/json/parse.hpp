@@ -192,12 +192,17 @@ inline ParseReport parse(std::string_view text, Value& out, const ParseOptions& 
     return report;
 }
 
-/// Reads the rest of `in` and parses it as the text overload does, with the same report and
-/// the same guarantees for `out`. A stream that fails while it is read (its buffer throws, or
-/// it was bad from the start) is a failure too, UNEXPECTED_END_OF_INPUT with the note "the
-/// stream failed while it was read" at the offset reached, and `out` is left as it was.
-/// The stream ends with eofbit set (badbit after a failure); exceptions the caller enabled for
-/// those on the stream propagate. Memory: the whole text is held at once.
+/// Reads the rest of `in` and parses it as the text overload does, with the same options, the
+/// same report and the same guarantees for `out`. A stream that cannot give the text is a
+/// failure too, with `out` left as it was: UNEXPECTED_END_OF_INPUT at 1:1 with the note "the
+/// stream was not readable" when failbit or badbit was set before anything was read (a
+/// std::ifstream of a missing file), and with the note "the stream failed while it was read",
+/// just after the last byte read, when its buffer throws. A stream already at its end (eofbit
+/// only) is an empty text. The stream ends with eofbit set; with badbit after its buffer
+/// threw, failbit when it was not readable. Exceptions the caller enabled on the stream for
+/// those bits propagate, except that with badbit enabled the buffer's own exception passes on
+/// (not std::ios::failure), as from the standard input functions. Throws std::bad_alloc.
+/// Memory: the whole text is held at once.
 JSONVALUE_API ParseReport parse(std::istream& in, Value& out, const ParseOptions& options);
 
 /// Parses as above with the default options and returns the code alone.

@@ -65,14 +65,16 @@ class Parser {
         std::size_t slot;          // for a marker, index of its finished container
     };
 
-    ParseResult parse_value(bool& completed);
-    std::optional<std::string_view> plain_string();
+    // The steps every token takes are inlined into the token loop, whatever the compiler's
+    // estimate of their size: calls to them cost more than their bodies.
+    [[gnu::always_inline]] ParseResult parse_value(bool& completed);
+    [[gnu::always_inline]] std::optional<std::string_view> plain_string();
     ParseResult parse_string(std::string& text);
     ParseResult parse_escape(std::string& text);
     ParseResult parse_unicode_escapes(std::string& text);
-    ParseResult parse_number();
+    [[gnu::always_inline]] ParseResult parse_number();
     static bool held_exactly(std::string_view literal, std::ptrdiff_t digits, double value);
-    ParseResult refuse_inexact(std::string_view literal);
+    [[gnu::cold]] ParseResult refuse_inexact(std::string_view literal);
     ParseResult parse_literal(std::string_view literal, ParseResult mismatch);
     ParseResult parse_member_name();
     ParseResult after_comma(bool in_object, bool& closed);
@@ -84,18 +86,25 @@ class Parser {
     template <typename Alternative>
     Value& push_value(Alternative&& value);
     void grow_values();
-    ParseResult fail(ParseResult result, std::string_view note = {});
-    ParseResult refuse(Refusal why, ParseResult result, std::string_view note) {
+    // The ways out of the grammar are cold: kept apart from the hot code, so that the token
+    // loop stays small enough to be inlined whole.
+    [[gnu::cold]] ParseResult fail(ParseResult result, std::string_view note = {});
+    [[gnu::cold]] ParseResult refuse(Refusal why, ParseResult result, std::string_view note) {
         refused = why;
         return fail(result, note);
     }
-    void skip_whitespace() {
-        // Most tokens follow the previous one directly: no scan is set up for them.
-        if (cursor != end && is_whitespace(*cursor)) {
-            cursor = detail::skip_whitespace(cursor + 1, end);
-        }
-        if (options.allow_comments && at('/')) {
-            skip_comments();
+    [[gnu::always_inline]] void skip_whitespace() {
+        // Most tokens follow the previous one directly: one test of the next byte says so. The
+        // byte that starts a comment is in the same test, so that where comments are allowed
+        // they cost nothing until one is met.
+        constexpr std::uint64_t blank_or_slash =
+            1ULL << ' ' | 1ULL << '\n' | 1ULL << '\r' | 1ULL << '\t' | 1ULL << '/';
+        if (cursor != end && static_cast<unsigned char>(*cursor) < 64 &&
+            (blank_or_slash >> static_cast<unsigned char>(*cursor) & 1U) != 0) {
+            cursor = detail::skip_whitespace(cursor, end);
+            if (options.allow_comments && at('/')) {
+                skip_comments();
+            }
         }
     }
     void skip_comments();
