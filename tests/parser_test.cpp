@@ -257,6 +257,10 @@ TEST(ParseOptions, Utf8Boundaries) {
         {"\xE0\x9F\xBF", false}, // overlong
         {"\xE0\xBF\xBF", true},
         {"\xE1\x80\x80", true},
+        {"\xE1\xC0\x80", false}, // a second or third byte that is no continuation byte
+        {"\xE1\x80\xC0", false},
+        {"\xE1\x80\x7F", false},
+        {"\xDF\xC0", false},
         {"\xEC\xBF\xBF", true},
         {"\xED\x80\x80", true},
         {"\xED\x9F\xBF", true},

@@ -75,6 +75,26 @@ inline const char* find_special_or_ill_formed(const char* from, const char* end)
     for (;;) {
         from = find_special_byte<WithSlash, true>(from, end);
         while (from != end && static_cast<unsigned char>(*from) >= 0x80) {
+            // Most characters are two bytes (Latin, Greek, Cyrillic, Hebrew, Arabic) or three
+            // bytes with a lead from E1 to EF other than ED (CJK and most other scripts), whose
+            // later bytes are plain continuation bytes: those are checked in one step each.
+            const auto lead = static_cast<unsigned char>(*from);
+            if (lead >= 0xC2 && lead <= 0xDF && end - from >= 2) { // likewise two bytes
+                if ((static_cast<unsigned char>(from[1]) & 0xC0U) != 0x80U) {
+                    return from;
+                }
+                from += 2;
+                continue;
+            }
+            if (lead >= 0xE1 && lead != 0xED && lead <= 0xEF && end - from >= 3) {
+                const auto second = static_cast<unsigned char>(from[1]);
+                const auto third = static_cast<unsigned char>(from[2]);
+                if (((second & third) & 0xC0U) != 0x80U || ((second | third) & 0x40U) != 0) {
+                    return from;
+                }
+                from += 3;
+                continue;
+            }
             const std::size_t length = utf8_sequence_length(from, end);
             if (length == 0) {
                 return from;
