@@ -1,6 +1,6 @@
-// jsonfmt: validates JSON documents (whole files or JSON Lines) and writes them pretty
-// (4-space) or compact, whole or the value at a JSON Pointer, to standard output, a file, or
-// back into each file.
+// jsonfmt: validates JSON documents (whole files or JSON Lines) and writes them pretty (2-space
+// by default) or compact, whole or the value at a JSON Pointer, to standard output, a file, or
+// back into each file. Nothing the document model would change passes unless --lossy says so.
 #include "file_output.hpp"
 
 #include <json/json.hpp>
@@ -14,6 +14,7 @@
 #include <cstring>
 #include <fcntl.h>
 #include <new>
+#include <optional>
 #include <ostream>
 #include <stdexcept>
 #include <string>
@@ -29,15 +30,26 @@ constexpr const char* VERSION = "0.1.0";
 
 enum ExitStatus { VALID = 0, INVALID = 1, TROUBLE = 2 };
 
-struct Settings {
+// The layout options as given; chosen_layout() turns them into the writer's options.
+struct Layout {
     bool compact = false;
+    unsigned indent = 2;
+    bool tab = false;
+    bool ascii = false;
+    bool library = false;
+};
+
+struct Settings {
     bool check_only = false;
     bool lines = false;
     bool in_place = false;
+    bool lossy = false;
     std::string pointer;
     bool has_pointer = false;
     std::string output_path;
+    Layout layout;
     json::ParseOptions parse_options;
+    json::WriteOptions write_options;
     std::vector<std::string> files;
 };
 
@@ -97,17 +109,90 @@ void show_failure_line(std::string_view text, const json::ParseReport& report) {
     std::fwrite(shown.data(), 1, shown.size(), stderr);
 }
 
+// The parser's note with jsonfmt's flag in place of each library option it names. jsonfmt turns
+// exact_numbers and reject_duplicate_keys on by default, so "without" them is "with --lossy";
+// the other options are off by default, and the flag that turns each on takes its name.
+std::string with_flag_names(std::string note) {
+    static constexpr std::pair<std::string_view, std::string_view> OPTION_TO_FLAG[] = {
+        {"the allow_comments option", "--allow-comments"},
+        {"the allow_trailing_commas option", "--allow-trailing-commas"},
+        {"the allow_invalid_utf8 option", "--lossy"},
+        {"the allow_lone_surrogates option", "--lossy"},
+        {"without the exact_numbers option", "with --lossy"},
+        {"without the reject_duplicate_keys option", "with --lossy"},
+    };
+    for (const auto& [option, flag] : OPTION_TO_FLAG) {
+        if (const std::size_t at = note.find(option); at != std::string::npos) {
+            note.replace(at, option.size(), flag);
+        }
+    }
+    return note;
+}
+
+// What a failed parse is reported as. A refusal of bad UTF-8 or of valid JSON is said by its
+// note alone: the grammar's code that comes with it only approximates the reason.
+std::string failure_message(const json::ParseReport& report) {
+    switch (report.refusal) {
+    case json::Refusal::NONE:
+    case json::Refusal::TOO_DEEP: {
+        json::ParseReport shown = report;
+        shown.note = with_flag_names(report.note);
+        return shown.message();
+    }
+    case json::Refusal::INVALID_UTF8:
+        return with_flag_names(report.note);
+    case json::Refusal::LONE_SURROGATE:
+    case json::Refusal::DUPLICATE_KEY:
+    case json::Refusal::INEXACT_NUMBER:
+        return "valid JSON, but jsonfmt would change it: " + with_flag_names(report.note);
+    }
+    return report.message(); // not reached: every refusal is handled above
+}
+
+// A document that is not written: where (the parser's report) and why.
+struct Rejection {
+    json::ParseReport report;
+    std::string message;
+};
+
+// Whether a comment the options let through would be lost: --in-place replaces the file with
+// text that has none, and only --lossy allows that.
+bool comments_must_survive(const Settings& settings) {
+    return settings.in_place && settings.parse_options.allow_comments && !settings.lossy;
+}
+
+// Parses `text` into `document` as the settings ask; nothing when it parsed. Where comments
+// must survive, the text is parsed without them first (one parse when there are none), and
+// only when that fails with them: if that succeeds, the only difference between the two
+// parses, a comment, is where the first one failed.
+std::optional<Rejection> parse_document(std::string_view text, json::Value& document,
+                                        const Settings& settings) {
+    const bool guarding_comments = comments_must_survive(settings);
+    json::ParseOptions options = settings.parse_options;
+    options.allow_comments = options.allow_comments && !guarding_comments;
+    const json::ParseReport report = json::parse(text, document, options);
+    if (report) {
+        return std::nullopt;
+    }
+    if (!guarding_comments) {
+        return Rejection{report, failure_message(report)};
+    }
+    const json::ParseReport with_comments = json::parse(text, document, settings.parse_options);
+    if (!with_comments) {
+        return Rejection{with_comments, failure_message(with_comments)};
+    }
+    return Rejection{report, "--in-place would drop this comment (add --lossy to allow that)"};
+}
+
 // Writes parsed documents, or the values at the pointer, onto one output.
 class Writer {
   public:
     Writer(const Settings& settings, int descriptor, std::string destination)
         : settings(settings), destination(std::move(destination)), buffer(descriptor),
-          stream(&buffer) {
-        serializer.pretty_print(!settings.compact && !settings.lines);
-    }
+          stream(&buffer) {}
 
     // Writes `document` (or its value at the pointer) and a newline. INVALID when the pointer
-    // finds nothing, TROUBLE when writing fails.
+    // finds nothing or --ascii cannot write a string, TROUBLE when writing fails.
     ExitStatus write(const json::Value& document, const std::string& where) {
         const json::Value* value = &document;
         if (settings.has_pointer) {
@@ -120,10 +205,17 @@ class Writer {
                 return INVALID;
             }
         }
-        if (!settings.check_only) {
-            serializer.write(stream, *value);
-            stream.put('\n');
+        if (settings.check_only) {
+            return VALID;
         }
+        try {
+            write_value(*value);
+        } catch (const std::invalid_argument& error) { // --ascii and a string that is not UTF-8
+            flush();
+            std::fprintf(stderr, "%s: --ascii: %s\n", where.c_str(), error.what());
+            return INVALID;
+        }
+        stream.put('\n');
         return VALID;
     }
 
@@ -141,18 +233,31 @@ class Writer {
     }
 
   private:
+    // Writes `value` onto the stream. ASCII-only text fails on a string that is not UTF-8,
+    // which only --lossy lets in: then the text is made whole before any of it goes out, so
+    // that no half of it is written anywhere (streamed, it could not be taken back).
+    void write_value(const json::Value& value) {
+        const json::WriteOptions& options = settings.write_options;
+        if (options.ascii_only && settings.parse_options.allow_invalid_utf8) {
+            const std::string text = json::serialize(value, options);
+            stream.write(text.data(), static_cast<std::streamsize>(text.size()));
+        } else {
+            json::write(stream, value, options);
+        }
+    }
+
     const Settings& settings;
     std::string destination;
     jsonfmt::DescriptorBuffer buffer;
     std::ostream stream;
-    json::Serializer serializer;
 };
 
-ExitStatus report_parse_failure(const std::string& where, std::string_view text,
-                                const json::ParseReport& report, std::size_t line, Writer& writer) {
+ExitStatus report_rejection(const std::string& where, std::string_view text,
+                            const Rejection& rejection, std::size_t line, Writer& writer) {
     writer.flush();
+    const json::ParseReport& report = rejection.report;
     std::fprintf(stderr, "%s:%zu:%zu: error: %s\n", where.c_str(), line + report.line - 1,
-                 report.column, report.message().c_str());
+                 report.column, rejection.message.c_str());
     show_failure_line(text, report);
     return INVALID;
 }
@@ -169,9 +274,8 @@ ExitStatus format_document(const std::string& name, const std::string& shown_nam
         }
     }
     json::Value document;
-    const json::ParseReport report = json::parse(text, document, settings.parse_options);
-    if (!report) {
-        return report_parse_failure(shown_name, text, report, 1, writer);
+    if (const auto rejection = parse_document(text, document, settings)) {
+        return report_rejection(shown_name, text, *rejection, 1, writer);
     }
     return writer.write(document, shown_name);
 }
@@ -207,11 +311,11 @@ ExitStatus format_lines(const std::string& name, const std::string& shown_name,
             continue;
         }
         json::Value document;
-        const json::ParseReport report = json::parse(text, document, settings.parse_options);
+        const auto rejection = parse_document(text, document, settings);
         const std::string where = shown_name + ":" + std::to_string(number);
         status = std::max(status,
-                          report ? writer.write(document, where)
-                                 : report_parse_failure(shown_name, text, report, number, writer));
+                          rejection ? report_rejection(shown_name, text, *rejection, number, writer)
+                                    : writer.write(document, where));
     }
     // getline returns -1 at the end of the file and on a failure alike: only the end sets the
     // end-of-file flag. Running out of memory for a long line sets no flag at all, only errno.
@@ -312,16 +416,87 @@ bool is_one_of(const std::string& path, const std::vector<std::string>& files) {
     });
 }
 
+// By default nothing passes that the document model would change: a number a double cannot
+// hold exactly, a repeated member name (the model keeps one member), bytes that are not UTF-8
+// and unpaired surrogates. --lossy accepts them all as the library's lenient settings do.
+void choose_leniency(json::ParseOptions& options, bool lossy) {
+    options.exact_numbers = !lossy;
+    options.reject_duplicate_keys = !lossy;
+    options.allow_invalid_utf8 = lossy;
+    options.allow_lone_surrogates = lossy;
+}
+
+// The writer's options for the layout flags: the common two-space layout, or the library's own
+// pretty text (--library-layout). Compact text (--compact, and each line of --lines) is the
+// library's, but with the slash as itself as in the pretty layout.
+json::WriteOptions chosen_layout(const Layout& layout, bool lines) {
+    json::WriteOptions options;
+    if (layout.library) {
+        options.pretty = true;
+        return options;
+    }
+    options = json::COMMON_PRETTY;
+    options.indent = layout.indent;
+    options.indent_with_tab = layout.tab;
+    options.ascii_only = layout.ascii;
+    if (layout.compact || lines) {
+        options.pretty = false;
+        options.space_after_colon = false;
+    }
+    return options;
+}
+
+// Adds the options that say what is read: JSON as it is, or more, or lossily.
+void add_reading_options(CLI::App& app, Settings& settings) {
+    app.add_flag("--allow-comments", settings.parse_options.allow_comments,
+                 "accept // and /* */ comments, as in {\"a\": 1 // one}; they are not written");
+    app.add_flag("--allow-trailing-commas", settings.parse_options.allow_trailing_commas,
+                 "accept one comma before ] or }, as in [1, 2,]");
+    app.add_flag("--lossy", settings.lossy,
+                 "accept what the output cannot keep as written: 1e400 or 1234567890123456789 "
+                 "rounded to a double, {\"a\":1,\"a\":2} keeping the last member, \"\\ud800\" "
+                 "as U+FFFD, bytes that are not UTF-8 copied; with -i, comments dropped");
+}
+
+// Adds the options that say how the text is laid out.
+void add_layout_options(CLI::App& app, Settings& settings) {
+    Layout& layout = settings.layout;
+    CLI::Option* compact =
+        app.add_flag("-c,--compact", layout.compact, "write compact text: {\"a\":[1,2]}");
+    CLI::Option* indent =
+        app.add_option("--indent", layout.indent,
+                       "indent pretty text N spaces per level, 0 to 16 (default 2); 0 keeps "
+                       "the line breaks")
+            ->type_name("N")
+            ->check(CLI::Range(0U, 16U));
+    CLI::Option* tab =
+        app.add_flag("--tab", layout.tab, "indent pretty text one tab per level")->excludes(indent);
+    app.add_flag("--ascii", layout.ascii, "escape every character above U+007F: caf\\u00e9");
+    CLI::Option* library =
+        app.add_flag("--library-layout", layout.library,
+                     "the library's own pretty text: 4 spaces, {\"a\":1}, [    ] for an empty "
+                     "array, \\/ for /")
+            ->excludes(indent)
+            ->excludes(tab)
+            ->excludes("--ascii");
+    compact->excludes(indent)->excludes(tab)->excludes(library);
+}
+
 // Fills `settings` from the command line; returns an exit status when the program is done.
 bool read_arguments(int argc, char** argv, Settings& settings, int& status) {
-    CLI::App app("Checks JSON documents and writes them pretty (4-space indentation, keys "
+    CLI::App app("Checks JSON documents and writes them pretty (2-space indentation, keys "
                  "sorted) or compact.\nReads each FILE, or standard input when there is none "
                  "or for \"-\".",
                  "jsonfmt");
     app.set_help_flag("-h,--help", "show this help and exit");
-    app.add_flag("-c,--compact", settings.compact, "write compact text, without whitespace");
+    add_layout_options(app, settings);
+    add_reading_options(app, settings);
     app.add_flag("--check", settings.check_only, "only check the documents; write nothing");
-    app.add_flag("-l,--lines", settings.lines, "JSON Lines: one document per non-blank line");
+    app.add_flag("-l,--lines", settings.lines,
+                 "JSON Lines: one document per non-blank line, written compact")
+        ->excludes("--indent")
+        ->excludes("--tab")
+        ->excludes("--library-layout");
     app.add_option("-p,--pointer", settings.pointer, "write only the value at this JSON Pointer")
         ->type_name("PTR");
     app.add_option("-o,--output", settings.output_path, "write to FILE, not standard output")
@@ -359,6 +534,8 @@ bool read_arguments(int argc, char** argv, Settings& settings, int& status) {
         return true;
     }
     settings.has_pointer = app.count("--pointer") != 0;
+    choose_leniency(settings.parse_options, settings.lossy);
+    settings.write_options = chosen_layout(settings.layout, settings.lines);
     std::string usage_error;
     if (settings.has_pointer) {
         try {
