@@ -129,24 +129,21 @@ std::string with_flag_names(std::string note) {
     return note;
 }
 
+// Whether `refusal` is of text that is JSON, but that the document model would change.
+bool changes_valid_json(json::Refusal refusal) {
+    return refusal == json::Refusal::INEXACT_NUMBER || refusal == json::Refusal::DUPLICATE_KEY ||
+           refusal == json::Refusal::LONE_SURROGATE;
+}
+
 // What a failed parse is reported as. A refusal of bad UTF-8 or of valid JSON is said by its
 // note alone: the grammar's code that comes with it only approximates the reason.
 std::string failure_message(const json::ParseReport& report) {
-    switch (report.refusal) {
-    case json::Refusal::NONE:
-    case json::Refusal::TOO_DEEP: {
-        json::ParseReport shown = report;
-        shown.note = with_flag_names(report.note);
-        return shown.message();
+    json::ParseReport shown = report;
+    shown.note = with_flag_names(report.note);
+    if (changes_valid_json(report.refusal)) {
+        return "valid JSON, but jsonfmt would change it: " + shown.note;
     }
-    case json::Refusal::INVALID_UTF8:
-        return with_flag_names(report.note);
-    case json::Refusal::LONE_SURROGATE:
-    case json::Refusal::DUPLICATE_KEY:
-    case json::Refusal::INEXACT_NUMBER:
-        return "valid JSON, but jsonfmt would change it: " + with_flag_names(report.note);
-    }
-    return report.message(); // not reached: every refusal is handled above
+    return report.refusal == json::Refusal::INVALID_UTF8 ? shown.note : shown.message();
 }
 
 // A document that is not written: where (the parser's report) and why.
@@ -491,7 +488,8 @@ bool read_arguments(int argc, char** argv, Settings& settings, int& status) {
     app.set_help_flag("-h,--help", "show this help and exit");
     add_layout_options(app, settings);
     add_reading_options(app, settings);
-    app.add_flag("--check", settings.check_only, "only check the documents; write nothing");
+    app.add_flag("--check", settings.check_only,
+                 "only check the documents, under the same rules; write nothing");
     app.add_flag("-l,--lines", settings.lines,
                  "JSON Lines: one document per non-blank line, written compact")
         ->excludes("--indent")
@@ -516,8 +514,9 @@ bool read_arguments(int argc, char** argv, Settings& settings, int& status) {
     app.set_version_flag("--version", std::string("jsonfmt ") + VERSION,
                          "show the version and exit");
     app.add_option("FILE", settings.files, "the documents to read")->type_name("");
-    app.footer("Exit status: 0 when every document is valid, 1 when one is invalid or a pointer\n"
-               "finds nothing, 2 for usage errors, I/O errors and running out of memory.");
+    app.footer("Exit status: 0 when every document is valid, 1 when one is invalid or refused,\n"
+               "a pointer finds nothing or --ascii cannot write it, 2 for usage errors, I/O\n"
+               "errors and running out of memory.");
     try {
         app.parse(argc, argv);
     } catch (const CLI::CallForHelp&) {
