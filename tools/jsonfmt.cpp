@@ -427,12 +427,12 @@ void choose_leniency(json::ParseOptions& options, bool lossy) {
 // pretty text (--library-layout). Compact text (--compact, and each line of --lines) is the
 // library's, but with the slash as itself as in the pretty layout.
 json::WriteOptions chosen_layout(const Layout& layout, bool lines) {
-    json::WriteOptions options;
     if (layout.library) {
-        options.pretty = true;
-        return options;
+        json::WriteOptions library;
+        library.pretty = true;
+        return library;
     }
-    options = json::COMMON_PRETTY;
+    json::WriteOptions options = json::COMMON_PRETTY;
     options.indent = layout.indent;
     options.indent_with_tab = layout.tab;
     options.ascii_only = layout.ascii;
@@ -468,7 +468,8 @@ void add_layout_options(CLI::App& app, Settings& settings) {
             ->check(CLI::Range(0U, 16U));
     CLI::Option* tab =
         app.add_flag("--tab", layout.tab, "indent pretty text one tab per level")->excludes(indent);
-    app.add_flag("--ascii", layout.ascii, "escape every character above U+007F: caf\\u00e9");
+    app.add_flag("--ascii", layout.ascii,
+                 "write every character above U+007F as a \\u escape: \"caf\\u00e9\"");
     CLI::Option* library =
         app.add_flag("--library-layout", layout.library,
                      "the library's own pretty text: 4 spaces, {\"a\":1}, [    ] for an empty "
