@@ -1,13 +1,12 @@
+#include <json/events.hpp>
 #include <json/parse.hpp>
 
 #include <codecvt_ustring_to_string.hpp>
 #include <number_text.hpp>
 
-#include <algorithm>
-#include <array>
 #include <istream>
-#include <new>
 #include <stdexcept>
+#include <string>
 
 namespace json {
 
@@ -70,71 +69,18 @@ std::string u16_to_u8(char16_t* text, int count) {
 
 } // namespace detail
 
-namespace {
-
-// The report of a stream that failed: UNEXPECTED_END_OF_INPUT at the end of what was read.
-ParseReport stream_failure(std::string_view text, const char* note) {
-    ParseReport report;
-    report.result = ParseResult::UNEXPECTED_END_OF_INPUT;
-    report.note = note;
-    detail::locate(report, text, text.size());
-    return report;
-}
-
-// Appends the rest of `buffer` to `text`. What the buffer says it holds is taken on its own,
-// so that a buffer that throws when it refills has given every byte before into `text`; when
-// it holds nothing, a whole chunk is asked for, refilled as often as it takes. xsgetn stops
-// short only at the end of the stream.
-void read_rest(std::streambuf& buffer, std::string& text) {
-    std::array<char, std::size_t{64} * 1024> chunk;
-    const auto size = static_cast<std::streamsize>(chunk.size());
-    for (std::streamsize held = buffer.in_avail(); held >= 0; held = buffer.in_avail()) {
-        const std::streamsize count = held > 0 ? std::min(held, size) : size;
-        const std::streamsize got = buffer.sgetn(chunk.data(), count);
-        text.append(chunk.data(), static_cast<std::size_t>(got));
-        if (got < count) {
-            return;
-        }
-    }
-}
-
-// Sets badbit after the stream buffer threw, as the standard input functions do: without the
-// std::ios::failure that setstate would throw when the caller enabled exceptions for badbit,
-// so that the buffer's own exception can be rethrown instead.
-void set_bad_without_throwing(std::istream& in) {
-    const std::ios::iostate enabled = in.exceptions();
-    in.exceptions(std::ios::goodbit);
-    in.setstate(std::ios::badbit);
-    try {
-        in.exceptions(enabled); // sets the mask back first, then throws as the state is bad
-    } catch (const std::ios::failure&) { // NOLINT(bugprone-empty-catch): replaced by the cause
-    }
-}
-
-} // namespace
-
 ParseReport parse(std::istream& in, Value& out, const ParseOptions& options) {
-    // Failed before anything is read (a file that did not open): not an empty text.
-    const bool unreadable = in.fail();
-    std::string text;
-    const std::istream::sentry ready(in, true); // whitespace is the parser's business
-    if (!ready) {
-        return unreadable ? stream_failure(text, "the stream was not readable")
-                          : parse(text, out, options); // at the end already: an empty text
+    detail::DocumentBuilder builder(options);
+    detail::Grammar<detail::DocumentBuilder> grammar(builder, options);
+    detail::TextPosition position;
+    std::string rest;
+    ParseReport report = detail::feed_stream(in, grammar, position, rest);
+    if (report) {
+        builder.take(out);
+    } else {
+        builder.explain(report);
     }
-    try {
-        read_rest(*in.rdbuf(), text);
-    } catch (const std::bad_alloc&) {
-        throw;
-    } catch (...) {
-        set_bad_without_throwing(in);
-        if ((in.exceptions() & std::ios::badbit) != 0) {
-            throw;
-        }
-        return stream_failure(text, "the stream failed while it was read");
-    }
-    in.setstate(std::ios::eofbit);
-    return parse(text, out, options);
+    return report;
 }
 
 } // namespace json

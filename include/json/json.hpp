@@ -5,6 +5,7 @@
 // (from a document or from events) and parsing.
 #include <json/builders.hpp>
 #include <json/convert.hpp>
+#include <json/events.hpp>
 #include <json/parse.hpp>
 #include <json/serializer.hpp>
 #include <json/value.hpp>

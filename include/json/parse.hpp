@@ -101,6 +101,7 @@ enum class Refusal {
     LONE_SURROGATE, ///< a \u escape of a surrogate without its other half
     DUPLICATE_KEY,  ///< a member name given twice, with reject_duplicate_keys
     INEXACT_NUMBER, ///< a number a double cannot hold exactly, with exact_numbers
+    STOPPED,        ///< a handler of json::parse_events returned false
 };
 
 /// The detailed outcome of json::parse: the code, and for a failure where it happened and,
@@ -138,28 +139,59 @@ struct ParseReport {
 
 namespace detail {
 
-/// Sets the offset, line and column of a failure at `offset` in `text`.
-inline void locate(ParseReport& report, std::string_view text, std::size_t offset) {
-    report.offset = offset;
-    const std::string_view before = text.substr(0, offset);
-    const std::size_t line_start = before.rfind('\n');
-    report.line = 1 + static_cast<std::size_t>(std::count(before.begin(), before.end(), '\n'));
-    report.column = offset - (line_start == std::string_view::npos ? 0 : line_start + 1) + 1;
+/// Where a text read so far stands: how many bytes lie before a point of it, on which line
+/// that point is and where that line starts. The pieces of a stream are counted as they are
+/// left behind, so that a failure in the piece at hand is placed from the start of the text.
+struct TextPosition {
+    std::size_t offset = 0;     // bytes counted
+    std::size_t line = 1;       // the line `offset` is on
+    std::size_t line_start = 0; // the offset of that line's first byte
+
+    void advance(std::string_view text) {
+        const std::size_t last_newline = text.rfind('\n');
+        if (last_newline != std::string_view::npos) {
+            line += static_cast<std::size_t>(std::count(text.begin(), text.end(), '\n'));
+            line_start = offset + last_newline + 1;
+        }
+        offset += text.size();
+    }
+
+    /// Places a failure at `at` (from the start of the text) in `report`, `rest` being the
+    /// text from `offset` on.
+    void locate(ParseReport& report, std::string_view rest, std::size_t at) const {
+        TextPosition there = *this;
+        there.advance(rest.substr(0, at - offset));
+        report.offset = at;
+        report.line = there.line;
+        report.column = at - there.line_start + 1;
+    }
+};
+
+/// The report of a grammar that ended with `result`, a failure at its failure_offset().
+template <typename Grammar>
+ParseReport failure_report(ParseResult result, Grammar& grammar, const TextPosition& position,
+                           std::string_view rest) {
+    ParseReport report;
+    report.result = result;
+    report.refusal = grammar.refusal();
+    report.note = grammar.take_note();
+    position.locate(report, rest, grammar.failure_offset());
+    return report;
 }
 
 } // namespace detail
 
 } // namespace json
 
-#include <json/detail/parser.hpp>
+#include <json/detail/document_builder.hpp>
+#include <json/detail/grammar.hpp>
 
 namespace json {
 
 /// Parses exactly one JSON text (RFC 8259): one value of any kind, with only whitespace
 /// around it (and comments, when `options` allow them). On success stores the document in
 /// `out`. On failure or refusal `out` is left exactly as it was and the report says where and
-/// why. Iterative, linear in the length of the text (duplicate member names are looked for
-/// in O(n log n) of an object's n members, when the object closes).
+/// why. Iterative, linear in the length of the text.
 ///
 /// - Numbers become double (alternative 3); a number beyond the range of double becomes plus
 ///   or minus infinity, one below it plus or minus zero, and digits beyond a double's
@@ -169,7 +201,7 @@ namespace json {
 ///   and member names must be well-formed UTF-8 (or are kept byte for byte with
 ///   allow_invalid_utf8). Raw control characters in strings are refused.
 /// - When an object has a member name twice, the last member wins (or, with
-///   reject_duplicate_keys, the object is refused once it closes, at the second name).
+///   reject_duplicate_keys, the second name is refused).
 /// - A comment or a trailing comma met while the options do not allow it fails as the
 ///   grammar says, with a note that names the option.
 /// - Text after the value is refused with UNEXPECTED_END_OF_INPUT and a note saying so.
@@ -181,14 +213,15 @@ namespace json {
 /// if memory stays exhausted for both does `out` end up holding `false`, its old content
 /// released (never any part of the new document).
 inline ParseReport parse(std::string_view text, Value& out, const ParseOptions& options) {
-    detail::Parser parser(text, options);
-    ParseReport report;
-    report.result = parser.run(out);
-    if (report.result != ParseResult::SUCCESS) {
-        report.refusal = parser.refusal();
-        report.note = parser.take_note();
-        detail::locate(report, text, parser.failure_offset());
+    detail::DocumentBuilder builder(options);
+    detail::Grammar<detail::DocumentBuilder> grammar(builder, options);
+    const ParseResult result = grammar.feed(text.data(), text.data() + text.size(), true);
+    if (result == ParseResult::SUCCESS) {
+        builder.take(out);
+        return ParseReport();
     }
+    ParseReport report = detail::failure_report(result, grammar, detail::TextPosition(), text);
+    builder.explain(report);
     return report;
 }
 

@@ -1,0 +1,148 @@
+#ifndef JSON_EVENTS_HPP
+#define JSON_EVENTS_HPP
+
+// Reading JSON as events: the grammar of json::parse, reporting to a handler of the caller's
+// instead of building a document, from text or from a stream read in pieces; and validation.
+
+#include <json/detail/export.hpp>
+#include <json/parse.hpp>
+
+#include <cstddef>
+#include <istream>
+#include <string>
+#include <string_view>
+
+namespace json {
+
+// A handler is any type with these members, each returning true to go on or false to stop
+// the parse (json::Writer is one, so parse_events(text, writer) reformats text):
+//
+//     bool null();
+//     bool boolean(bool value);
+//     bool number(std::string_view literal); // the number as written: "1e400", "1.50"
+//     bool string(std::string_view utf8);     // escapes resolved
+//     bool key(std::string_view utf8);        // a member name, escapes resolved
+//     bool begin_array();
+//     bool end_array();
+//     bool begin_object();
+//     bool end_object();
+//
+// The views are valid until the call returns. Numbers arrive as their literal text, so a
+// handler can read a 64-bit integer exactly (std::from_chars into a std::int64_t, say).
+
+namespace detail {
+
+/// Reads a std::istream in pieces for the grammar, as the standard input functions read:
+/// whitespace is not skipped, a stream that failed before anything was read is not readable,
+/// and a stream buffer that throws sets badbit (its own exception passes on when the caller
+/// enabled exceptions for badbit). Memory: only what it is asked to append.
+class JSONVALUE_API StreamPieces {
+  public:
+    explicit StreamPieces(std::istream& in);
+
+    /// Appends up to `count` bytes of the stream to `text`; false when none follows them (the
+    /// stream ended, or failed: failure() says so). Sets eofbit at the end of the stream.
+    /// Throws what the stream buffer throws when the caller enabled exceptions for badbit,
+    /// and std::bad_alloc.
+    bool append(std::string& text, std::size_t count);
+
+    /// Why the stream gave no more text although it did not end, or null.
+    const char* failure() const { return failure_note; }
+
+  private:
+    std::istream& in;
+    bool started = false;
+    const char* failure_note = nullptr;
+};
+
+/// Feeds `grammar` the text of `in` piece by piece and reports the outcome. Memory: the open
+/// containers, the longest token and one piece, never the whole text.
+template <typename Grammar>
+ParseReport feed_stream(std::istream& in, Grammar& grammar, TextPosition& position,
+                        std::string& rest) {
+    constexpr std::size_t piece = std::size_t{64} * 1024;
+    StreamPieces pieces(in);
+    std::size_t asked = piece;
+    for (;;) {
+        const bool more = pieces.append(rest, asked);
+        if (pieces.failure() != nullptr) {
+            ParseReport report;
+            report.result = ParseResult::UNEXPECTED_END_OF_INPUT;
+            report.note = pieces.failure();
+            position.locate(report, rest, position.offset + rest.size());
+            return report;
+        }
+        const ParseResult result = grammar.feed(rest.data(), rest.data() + rest.size(), !more);
+        if (result != Grammar::NEED_MORE) {
+            return result == ParseResult::SUCCESS ? ParseReport()
+                                                  : failure_report(result, grammar, position, rest);
+        }
+        // The rest of the piece is a token begun: it is read again with the next piece. A
+        // token that takes many pieces makes them grow, so that it is read again only as
+        // often as its length doubles.
+        const std::size_t consumed = grammar.consumed();
+        position.advance(std::string_view(rest).substr(0, consumed));
+        rest.erase(0, consumed);
+        asked = consumed == 0 ? asked + rest.size() : piece;
+    }
+}
+
+/// The handler of json::validate: accepts every event.
+struct NoHandler {
+    bool null() { return true; }
+    bool boolean(bool) { return true; }
+    bool number(std::string_view) { return true; }
+    bool string(std::string_view) { return true; }
+    bool key(std::string_view) { return true; }
+    bool begin_array() { return true; }
+    bool end_array() { return true; }
+    bool begin_object() { return true; }
+    bool end_object() { return true; }
+};
+
+} // namespace detail
+
+/// Reads one JSON text with the grammar of json::parse and reports its tokens to `handler`
+/// in document order, building nothing. The options act as for json::parse, except the two
+/// that concern a document: member names are reported as they come, repeated or not
+/// (reject_duplicate_keys is for the handler to apply), and numbers as their literals
+/// (exact_numbers likewise). A handler that returns false stops the parse: the report says
+/// UNEXPECTED_END_OF_INPUT with Refusal::STOPPED, at the token that was being reported. A
+/// failure is reported after the events of every token before it. Linear in the length of
+/// the text; iterative. Throws std::bad_alloc and what the handler throws.
+template <typename Handler>
+ParseReport parse_events(std::string_view text, Handler& handler,
+                         const ParseOptions& options = {}) {
+    detail::Grammar<Handler> grammar(handler, options);
+    const ParseResult result = grammar.feed(text.data(), text.data() + text.size(), true);
+    return result == ParseResult::SUCCESS
+               ? ParseReport()
+               : detail::failure_report(result, grammar, detail::TextPosition(), text);
+}
+
+/// As above, reading the rest of `in` in pieces of 64 KiB: memory is bounded by the nesting
+/// depth and the longest string or number, never by the length of the text. Offsets, lines
+/// and columns count from where the stream was. A stream that cannot give the text is a
+/// failure, reported as json::parse(std::istream&) reports it; the stream ends as it does.
+template <typename Handler>
+ParseReport parse_events(std::istream& in, Handler& handler, const ParseOptions& options = {}) {
+    detail::Grammar<Handler> grammar(handler, options);
+    detail::TextPosition position;
+    std::string rest;
+    return detail::feed_stream(in, grammar, position, rest);
+}
+
+/// The report json::parse would give for `text` with `options`, without building anything:
+/// the same outcome, code, place and note on every input. exact_numbers checks each number
+/// as it comes; reject_duplicate_keys holds the member names of the open objects. Linear in
+/// the length of the text. Throws std::bad_alloc.
+JSONVALUE_API ParseReport validate(std::string_view text, const ParseOptions& options = {});
+
+/// As above for the rest of `in`, read in pieces as parse_events reads it: memory bounded by
+/// the nesting depth and the longest token (and, with reject_duplicate_keys, the names of the
+/// open objects).
+JSONVALUE_API ParseReport validate(std::istream& in, const ParseOptions& options = {});
+
+} // namespace json
+
+#endif

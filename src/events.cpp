@@ -1,0 +1,147 @@
+#include <json/events.hpp>
+
+#include <algorithm>
+#include <ios>
+#include <new>
+
+namespace json {
+
+namespace detail {
+
+namespace {
+
+// Sets badbit after the stream buffer threw, as the standard input functions do: without the
+// std::ios::failure that setstate would throw when the caller enabled exceptions for badbit,
+// so that the buffer's own exception can be rethrown instead.
+void set_bad_without_throwing(std::istream& in) {
+    const std::ios::iostate enabled = in.exceptions();
+    in.exceptions(std::ios::goodbit);
+    in.setstate(std::ios::badbit);
+    try {
+        in.exceptions(enabled); // sets the mask back first, then throws as the state is bad
+    } catch (const std::ios::failure&) { // NOLINT(bugprone-empty-catch): replaced by the cause
+    }
+}
+
+// Appends what `buffer` holds, up to `count` bytes, or when it holds nothing, up to `count`
+// bytes read through it; false at the end of the stream. Taking what the buffer holds on its
+// own means that a buffer that throws when it refills has given every byte before into
+// `text`. xsgetn stops short only at the end of the stream.
+bool append_from(std::streambuf& buffer, std::string& text, std::size_t count) {
+    const std::streamsize held = buffer.in_avail();
+    if (held < 0) {
+        return false;
+    }
+    const auto wanted = static_cast<std::streamsize>(count);
+    const std::streamsize asked = held > 0 ? std::min(held, wanted) : wanted;
+    const std::size_t before = text.size();
+    text.resize(before + static_cast<std::size_t>(asked));
+    std::streamsize got = 0;
+    try {
+        got = buffer.sgetn(&text[before], asked);
+    } catch (...) {
+        text.resize(before);
+        throw;
+    }
+    text.resize(before + static_cast<std::size_t>(got));
+    return got == asked;
+}
+
+// The handler of json::validate: builds nothing, and applies the options that concern a
+// document as the document builder does.
+class Validator {
+  public:
+    explicit Validator(const ParseOptions& options) : options(options) {}
+
+    bool null() { return true; }
+    bool boolean(bool) { return true; }
+    // The literal is NUL-terminated (the grammar's copy).
+    bool number(std::string_view literal) {
+        return !options.exact_numbers || held_exactly(literal, string_to_double(literal.data())) ||
+               refusal.inexact(literal);
+    }
+    bool string(std::string_view) { return true; }
+    bool key(std::string_view name) {
+        return !options.reject_duplicate_keys || repeated.add(name) || refusal.repeated_name();
+    }
+    bool begin_array() { return true; }
+    bool end_array() { return true; }
+    bool begin_object() {
+        if (options.reject_duplicate_keys) {
+            repeated.open_object();
+        }
+        return true;
+    }
+    bool end_object() {
+        if (options.reject_duplicate_keys) {
+            repeated.close_object();
+        }
+        return true;
+    }
+
+    void explain(ParseReport& report) { refusal.explain(report); }
+
+  private:
+    const ParseOptions options;
+    DocumentRefusal refusal;
+    MemberNames repeated;
+};
+
+} // namespace
+
+StreamPieces::StreamPieces(std::istream& in) : in(in) {}
+
+bool StreamPieces::append(std::string& text, std::size_t count) {
+    if (!started) {
+        started = true;
+        // Failed before anything is read (a file that did not open): not an empty text.
+        const bool unreadable = in.fail();
+        const std::istream::sentry ready(in, true); // whitespace is the grammar's business
+        if (!ready) {
+            failure_note = unreadable ? "the stream was not readable" : nullptr;
+            return false; // otherwise at the end already: an empty text
+        }
+    }
+    try {
+        if (append_from(*in.rdbuf(), text, count)) {
+            return true;
+        }
+    } catch (const std::bad_alloc&) {
+        throw;
+    } catch (...) {
+        set_bad_without_throwing(in);
+        if ((in.exceptions() & std::ios::badbit) != 0) {
+            throw;
+        }
+        failure_note = "the stream failed while it was read";
+        return false;
+    }
+    in.setstate(std::ios::eofbit);
+    return false;
+}
+
+} // namespace detail
+
+ParseReport validate(std::string_view text, const ParseOptions& options) {
+    detail::Validator validator(options);
+    detail::Grammar<detail::Validator> grammar(validator, options);
+    const ParseResult result = grammar.feed(text.data(), text.data() + text.size(), true);
+    if (result == ParseResult::SUCCESS) {
+        return ParseReport();
+    }
+    ParseReport report = detail::failure_report(result, grammar, detail::TextPosition(), text);
+    validator.explain(report);
+    return report;
+}
+
+ParseReport validate(std::istream& in, const ParseOptions& options) {
+    detail::Validator validator(options);
+    detail::Grammar<detail::Validator> grammar(validator, options);
+    detail::TextPosition position;
+    std::string rest;
+    ParseReport report = detail::feed_stream(in, grammar, position, rest);
+    validator.explain(report);
+    return report;
+}
+
+} // namespace json
