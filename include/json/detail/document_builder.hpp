@@ -86,8 +86,11 @@ class MemberNames {
   public:
     void open_object() { open_objects.emplace_back(); }
     void close_object() { open_objects.pop_back(); }
-    /// False when the innermost open object already has a member of this name.
-    bool add(std::string_view name) { return open_objects.back().emplace(name).second; }
+    /// False when the innermost open object already has a member of this name. Kept out of
+    /// line: only documents parsed with reject_duplicate_keys call it.
+    [[gnu::noinline]] bool add(std::string_view name) {
+        return open_objects.back().emplace(name).second;
+    }
 
   private:
     std::vector<std::unordered_set<std::string>> open_objects;

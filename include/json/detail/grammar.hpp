@@ -78,8 +78,8 @@ class Grammar {
     ParseResult escape(std::string& text);
     ParseResult unicode_escapes(std::string& text);
     ParseResult literal(std::string_view word, ParseResult mismatch);
-    ParseResult open(bool is_object);
-    ParseResult close();
+    [[gnu::always_inline]] ParseResult open(bool is_object);
+    [[gnu::always_inline]] ParseResult close();
     ParseResult trailing_comma(bool in_object);
 
     // A member name is read: the handler is told, and the colon that follows it directly (as
@@ -149,7 +149,7 @@ class Grammar {
         return true;
     }
     bool skip_comments();
-    const char* find_string_stop(const char* from) const {
+    [[gnu::always_inline]] const char* find_string_stop(const char* from) const {
         return options.allow_invalid_utf8 ? find_special_byte<false>(from, end)
                                           : find_special_or_ill_formed<false>(from, end);
     }
@@ -292,7 +292,7 @@ inline ParseResult Grammar<Handler>::value() {
 }
 
 template <typename Handler>
-ParseResult Grammar<Handler>::open(bool is_object) {
+inline ParseResult Grammar<Handler>::open(bool is_object) {
     if (open_containers.size() >= options.max_depth) {
         return refuse(Refusal::TOO_DEEP,
                       is_object ? ParseResult::MISSING_TRAILING_BRACE
@@ -307,7 +307,7 @@ ParseResult Grammar<Handler>::open(bool is_object) {
 }
 
 template <typename Handler>
-ParseResult Grammar<Handler>::close() {
+inline ParseResult Grammar<Handler>::close() {
     const bool is_object = open_containers.back() != 0;
     open_containers.pop_back();
     return is_object ? tell_value([this] { return handler.end_object(); })
