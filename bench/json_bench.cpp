@@ -4,7 +4,10 @@
 // parsing and compact writing only: its DOM is read-only, so there is nothing to copy.
 // jsonvalue's own writing with the common two-space layout, and its event writer against
 // RapidJSON's, both fed the events of one walk over a parsed jsonvalue document, are measured
-// too.
+// too; so are validation without building anything (against RapidJSON's Reader with a handler
+// that does nothing and UTF-8 validation, and nlohmann's SAX parser with such a handler), and
+// parsing with exact numbers against the default parse, on canada.json as jsonvalue writes it
+// (as it comes, most of its numbers have more digits than a double keeps, so it is refused).
 #include <json/json.hpp>
 
 #include <benchmark/benchmark.h>
@@ -14,6 +17,7 @@
 #include <nlohmann/json.hpp>
 #include <rapidjson/document.h>
 #include <rapidjson/prettywriter.h>
+#include <rapidjson/reader.h>
 #include <rapidjson/stringbuffer.h>
 #include <rapidjson/writer.h>
 #include <simdjson.h>
@@ -265,6 +269,41 @@ std::string write_events_with_rapidjson(const json::Value& document) {
     return std::string(buffer.GetString(), buffer.GetSize());
 }
 
+// A SAX handler for nlohmann's parser that accepts everything and keeps nothing.
+struct NlohmannNullHandler : nlohmann::json_sax<nlohmann::json> {
+    bool null() override { return true; }
+    bool boolean(bool) override { return true; }
+    bool number_integer(number_integer_t) override { return true; }
+    bool number_unsigned(number_unsigned_t) override { return true; }
+    bool number_float(number_float_t, const string_t&) override { return true; }
+    bool string(string_t&) override { return true; }
+    bool binary(binary_t&) override { return true; }
+    bool start_object(std::size_t) override { return true; }
+    bool key(string_t&) override { return true; }
+    bool end_object() override { return true; }
+    bool start_array(std::size_t) override { return true; }
+    bool end_array() override { return true; }
+    bool parse_error(std::size_t, const std::string&, const nlohmann::detail::exception&) override {
+        return false;
+    }
+};
+
+bool validate_with_jsonvalue(const std::string& text) {
+    return static_cast<bool>(json::validate(text));
+}
+
+bool validate_with_rapidjson(const std::string& text) {
+    rapidjson::Reader reader;
+    rapidjson::BaseReaderHandler<> handler;
+    rapidjson::StringStream stream(text.c_str());
+    return !reader.Parse<rapidjson::kParseValidateEncodingFlag>(stream, handler).IsError();
+}
+
+bool validate_with_nlohmann(const std::string& text) {
+    NlohmannNullHandler handler;
+    return nlohmann::json::sax_parse(text, &handler);
+}
+
 std::string read_file(const std::string& path) {
     std::ifstream file(path, std::ios::binary);
     if (!file) {
@@ -364,6 +403,50 @@ void register_layouts_and_events(const std::string& document_name, const std::st
     add("events", "rapidjson", write_events_with_rapidjson);
 }
 
+// Validation, building nothing, by each library that offers it.
+void register_validation(const std::string& document_name, const std::string& text) {
+    const auto add = [&](const std::string& library, bool (*validate)(const std::string&)) {
+        if (!validate(text)) {
+            throw std::runtime_error(library + " refused a benchmark document");
+        }
+        const std::string name = "validate/" + document_name + "/" + library;
+        benchmark::RegisterBenchmark(name.c_str(), [text, validate](auto& state) {
+            for (auto _ : state) {
+                benchmark::DoNotOptimize(validate(text));
+            }
+            count_bytes(state, text);
+        });
+    };
+    add("jsonvalue", validate_with_jsonvalue);
+    add("rapidjson", validate_with_rapidjson);
+    add("nlohmann", validate_with_nlohmann);
+}
+
+// jsonvalue's parse with ParseOptions::exact_numbers ("exact"), and its default parse, of the
+// text jsonvalue writes for a document.
+void register_exact_parse(const std::string& document_name, const std::string& written) {
+    json::ParseOptions exact;
+    exact.exact_numbers = true;
+    for (const auto& [operation, options] : {std::pair{std::string("parse"), json::ParseOptions()},
+                                             std::pair{std::string("exact"), exact}}) {
+        json::Value check;
+        if (!json::parse(written, check, options)) {
+            throw std::runtime_error("jsonvalue refused its own text of " + document_name);
+        }
+        const std::string name = operation + "/" + document_name + "/jsonvalue";
+        benchmark::RegisterBenchmark(name.c_str(), [written, options = options](auto& state) {
+            for (auto _ : state) {
+                auto document = std::make_unique<json::Value>();
+                json::parse(written, *document, options);
+                state.PauseTiming();
+                document.reset();
+                state.ResumeTiming();
+            }
+            count_bytes(state, written);
+        });
+    }
+}
+
 } // namespace
 
 int main(int argc, char** argv) {
@@ -377,7 +460,11 @@ int main(int argc, char** argv) {
         register_library<BoostJson>(name, text);
         register_library<SimdJson>(name, text);
         register_layouts_and_events(name, text);
+        register_validation(name, text);
     }
+    register_exact_parse("canada_written",
+                         json::serialize(*JsonValue::parse(
+                             read_file(std::string(JSON_BENCH_DATA_DIR) + "/canada.json"))));
     benchmark::RunSpecifiedBenchmarks();
     benchmark::Shutdown();
 }
