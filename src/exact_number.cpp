@@ -101,6 +101,11 @@ struct Significand {
     long long last_exponent = 0;
 };
 
+// The words below hold eight bytes of text in memory order, the first in the lowest byte.
+static_assert(__BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__, "digits are read eight at a time");
+
+constexpr std::uint64_t TEN_TO_THE[] = {1, 10, 100, 1000, 10000, 100000, 1000000, 10000000};
+
 // Whether the eight bytes of `chunk` are all decimal digits: each byte's high half is 3, and
 // stays 3 when 6 is added to it (so its low half is at most 9).
 bool eight_digits_in(std::uint64_t chunk) {
@@ -136,6 +141,20 @@ std::optional<Significand> read_significand(std::string_view number) {
                (std::memcpy(&chunk, here, sizeof chunk), eight_digits_in(chunk))) {
             significand.digits = significand.digits * 100000000 + eight_digits_value(chunk);
             here += 8;
+        }
+        // Fewer than eight digits that end the text (the usual end of a fraction): the eight
+        // bytes that end there, those before `here` (read already) turned into zeros.
+        const auto tail = static_cast<std::size_t>(end - here);
+        if (tail != 0 && tail < 8 && static_cast<std::size_t>(end - number.data()) >= 8) {
+            std::memcpy(&chunk, end - 8, sizeof chunk);
+            const auto read_bits = static_cast<unsigned>(8 * (8 - tail));
+            const std::uint64_t read_mask = (std::uint64_t{1} << read_bits) - 1;
+            chunk = (chunk & ~read_mask) | (0x3030303030303030U & read_mask);
+            if (eight_digits_in(chunk)) {
+                significand.digits =
+                    significand.digits * TEN_TO_THE[tail] + eight_digits_value(chunk);
+                here = end;
+            }
         }
         for (; here != end && *here >= '0' && *here <= '9'; ++here) {
             significand.digits = significand.digits * 10 + static_cast<std::uint64_t>(*here - '0');
