@@ -238,7 +238,7 @@ Verdict shortest_digits_verdict(const Significand& literal, double value) {
     const std::uint64_t power_of_ten = POWERS_OF_TEN[static_cast<std::size_t>(-e)];
     const auto shift = static_cast<unsigned>(2 - q);
     const Signed128 offset = static_cast<Signed128>(Unsigned128{literal.digits} << shift) -
-                             static_cast<Signed128>(Unsigned128{4 * m} * power_of_ten); // L - d
+                             static_cast<Signed128>((Unsigned128{m} << 2U) * power_of_ten); // L - d
     const std::int64_t half_unit = std::int64_t{1} << (shift - 1);
     const Signed128 distance = offset < 0 ? -offset : offset;
     if (distance == half_unit) {
