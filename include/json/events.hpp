@@ -30,6 +30,20 @@ namespace json {
 // The views are valid until the call returns. Numbers arrive as their literal text, so a
 // handler can read a 64-bit integer exactly (std::from_chars into a std::int64_t, say).
 
+/// A handler that accepts every event and keeps nothing. Derive from it and declare only the
+/// events you want: the parser calls them by name, so yours hide these (nothing is virtual).
+struct NoOpHandler {
+    bool null() { return true; }
+    bool boolean(bool) { return true; }
+    bool number(std::string_view) { return true; }
+    bool string(std::string_view) { return true; }
+    bool key(std::string_view) { return true; }
+    bool begin_array() { return true; }
+    bool end_array() { return true; }
+    bool begin_object() { return true; }
+    bool end_object() { return true; }
+};
+
 namespace detail {
 
 /// Reads a std::istream in pieces for the grammar, as the standard input functions read:
@@ -86,19 +100,6 @@ ParseReport feed_stream(std::istream& in, Grammar& grammar, TextPosition& positi
         asked = consumed == 0 ? asked + rest.size() : piece;
     }
 }
-
-/// The handler of json::validate: accepts every event.
-struct NoHandler {
-    bool null() { return true; }
-    bool boolean(bool) { return true; }
-    bool number(std::string_view) { return true; }
-    bool string(std::string_view) { return true; }
-    bool key(std::string_view) { return true; }
-    bool begin_array() { return true; }
-    bool end_array() { return true; }
-    bool begin_object() { return true; }
-    bool end_object() { return true; }
-};
 
 } // namespace detail
 
