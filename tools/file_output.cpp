@@ -115,7 +115,8 @@ void check_replaceable(const std::string& name, const struct stat& file) {
 
 } // namespace
 
-DescriptorBuffer::DescriptorBuffer(int descriptor) : descriptor(descriptor) {
+DescriptorBuffer::DescriptorBuffer(int descriptor)
+    : descriptor(descriptor), buffer(std::size_t{1} << 20) {
     setp(buffer.data(), buffer.data() + buffer.size());
 }
 
@@ -134,10 +135,20 @@ bool DescriptorBuffer::write_out(const char* bytes, std::size_t count) {
     return failure == 0;
 }
 
+// The buffer is full: the text before the current document goes out and the document's text
+// moves to the front, so that a document is held whole while it fits; one that fills the
+// buffer alone goes out too.
 DescriptorBuffer::int_type DescriptorBuffer::overflow(int_type c) {
-    if (!finish()) {
+    const std::size_t held = static_cast<std::size_t>(pptr() - pbase());
+    const std::size_t kept = document_start == 0 ? 0 : held - document_start;
+    if (!write_out(pbase(), held - kept)) {
         return traits_type::eof();
     }
+    document_went_out = document_went_out || kept == 0;
+    std::memmove(buffer.data(), buffer.data() + (held - kept), kept);
+    setp(buffer.data(), buffer.data() + buffer.size());
+    pbump(static_cast<int>(kept));
+    document_start = 0;
     if (!traits_type::eq_int_type(c, traits_type::eof())) {
         *pptr() = traits_type::to_char_type(c);
         pbump(1);
@@ -148,7 +159,22 @@ DescriptorBuffer::int_type DescriptorBuffer::overflow(int_type c) {
 bool DescriptorBuffer::finish() {
     const bool written = write_out(pbase(), static_cast<std::size_t>(pptr() - pbase()));
     setp(buffer.data(), buffer.data() + buffer.size());
+    document_start = 0;
     return written;
+}
+
+void DescriptorBuffer::begin_document() {
+    document_start = static_cast<std::size_t>(pptr() - pbase());
+    document_went_out = false;
+}
+
+bool DescriptorBuffer::abandon_document() {
+    if (document_went_out) {
+        return false;
+    }
+    setp(buffer.data(), buffer.data() + buffer.size());
+    pbump(static_cast<int>(document_start));
+    return true;
 }
 
 bool is_special_file(const std::string& name) {

@@ -4,10 +4,10 @@
 // Where jsonfmt's text goes: a file descriptor written in large pieces, and a file replaced
 // safely.
 
-#include <array>
 #include <streambuf>
 #include <string>
 #include <sys/types.h>
+#include <vector>
 
 namespace jsonfmt {
 
@@ -15,6 +15,10 @@ namespace jsonfmt {
 /// memory the output takes stays bounded however long the text is. The writer flushes its
 /// stream at every newline of pretty text; sync() hands nothing on for that (a system call
 /// per line would cost more than the line): finish() writes what is left.
+///
+/// The text of one document is held until it is complete while it fits the buffer (1 MiB), so
+/// that a document that fails halfway can be taken back whole: abandon_document(). A longer
+/// document streams out as it is made, and only its part still held can be taken back.
 class DescriptorBuffer : public std::streambuf {
   public:
     explicit DescriptorBuffer(int descriptor);
@@ -27,6 +31,13 @@ class DescriptorBuffer : public std::streambuf {
     /// The errno of the first failed write, or 0.
     int error() const { return failure; }
 
+    /// Marks the start of a document's text.
+    void begin_document();
+    /// Takes back the text of the document begun last, when none of it has gone out: true.
+    /// False when part of it was written already: what is held of it stays, so that the text
+    /// that goes out is the document's up to where it stopped, never a piece from its middle.
+    bool abandon_document();
+
   protected:
     int_type overflow(int_type c) override;
     int sync() override { return failure == 0 ? 0 : -1; }
@@ -36,7 +47,9 @@ class DescriptorBuffer : public std::streambuf {
 
     int descriptor;
     int failure = 0;
-    std::array<char, std::size_t{64} * 1024> buffer{};
+    std::vector<char> buffer;
+    std::size_t document_start = 0; // where the current document's text starts in the buffer
+    bool document_went_out = false; // whether part of it was written already
 };
 
 /// Whether `name` exists and is something other than a regular file (a device, a FIFO, a

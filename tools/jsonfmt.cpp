@@ -1,7 +1,12 @@
 // jsonfmt: validates JSON documents (whole files or JSON Lines) and writes them pretty (2-space
 // by default) or compact, whole or the value at a JSON Pointer, to standard output, a file, or
-// back into each file. Nothing the document model would change passes unless --lossy says so.
+// back into each file. The text streams from parser to writer: no document is built, so member
+// order, repeated names and number literals come out as they came in.
+#include "descriptor_input.hpp"
+#include "diagnostics.hpp"
 #include "file_output.hpp"
+#include "key_sorter.hpp"
+#include "pointer_filter.hpp"
 
 #include <json/json.hpp>
 
@@ -13,8 +18,8 @@
 #include <cstdlib>
 #include <cstring>
 #include <fcntl.h>
+#include <istream>
 #include <new>
-#include <optional>
 #include <ostream>
 #include <stdexcept>
 #include <string>
@@ -44,6 +49,7 @@ struct Settings {
     bool lines = false;
     bool in_place = false;
     bool lossy = false;
+    bool sort_keys = false;
     std::string pointer;
     bool has_pointer = false;
     std::string output_path;
@@ -57,15 +63,246 @@ void complain(const std::string& message) {
     std::fprintf(stderr, "jsonfmt: %s\n", message.c_str());
 }
 
-// Reads all of `file` into `text`; false (with errno set) when it cannot.
-bool read_all(std::FILE* file, std::string& text) {
-    char buffer[1 << 16];
-    std::size_t got = 0;
-    while ((got = std::fread(buffer, 1, sizeof buffer, file)) > 0) {
-        text.append(buffer, got);
+// A handler that takes every event and keeps nothing: --check reads with it.
+struct Discard {
+    bool null() { return true; }
+    bool boolean(bool) { return true; }
+    bool number(std::string_view) { return true; }
+    bool string(std::string_view) { return true; }
+    bool key(std::string_view) { return true; }
+    bool begin_array() { return true; }
+    bool end_array() { return true; }
+    bool begin_object() { return true; }
+    bool end_object() { return true; }
+};
+
+// A whole file, or standard input, read in pieces: memory does not follow its length.
+class StreamSource {
+  public:
+    explicit StreamSource(std::string name) : name(std::move(name)), input(this->name) {}
+
+    // The errno of a failure to open or read the file, or 0.
+    int error() const { return input.error(); }
+
+    template <typename Handler>
+    json::ParseReport parse(Handler& handler, const json::ParseOptions& options) {
+        std::istream in(&input);
+        return json::parse_events(in, handler, options);
     }
-    return std::ferror(file) == 0;
+
+    // The same file read again from its start (only a regular file, as --in-place takes, can).
+    StreamSource again() const { return StreamSource(name); }
+
+    // The failing line, as far as the pieces kept around the failure hold it.
+    void show(const json::ParseReport& report) const {
+        const std::size_t before = std::min(report.offset, jsonfmt::SHOWN_BEFORE);
+        const auto kept =
+            input.kept(report.offset - before, report.offset + jsonfmt::SHOWN_AFTER + 1);
+        jsonfmt::show_failure_line(kept.text, kept.start, report);
+    }
+
+  private:
+    std::string name;
+    jsonfmt::DescriptorInput input;
+};
+
+// One line of JSON Lines, in memory.
+struct LineSource {
+    std::string_view text;
+
+    int error() const { return 0; }
+
+    template <typename Handler>
+    json::ParseReport parse(Handler& handler, const json::ParseOptions& options) const {
+        return json::parse_events(text, handler, options);
+    }
+
+    LineSource again() const { return *this; }
+
+    void show(const json::ParseReport& report) const {
+        jsonfmt::show_failure_line(text, 0, report);
+    }
+};
+
+// What became of one document.
+struct DocumentResult {
+    json::ParseReport report;
+    std::string pointer_problem; // why --pointer found no value, or empty
+    std::string unwritable;      // why --ascii could not write a string, or empty
+    bool cut = false;            // part of its text went out before it failed
+
+    bool written() const { return report && pointer_problem.empty() && unwritable.empty(); }
+};
+
+// Parses with `parse` into `sink`, through the pointer's filter when there is one.
+template <typename Sink, typename Parse>
+DocumentResult parse_into(const Settings& settings, Sink& sink, Parse& parse) {
+    DocumentResult result;
+    if (!settings.has_pointer) {
+        result.report = parse(sink);
+        return result;
+    }
+    jsonfmt::PointerFilter<Sink> filter(settings.pointer, sink);
+    result.report = parse(filter);
+    if (result.report) {
+        result.pointer_problem = filter.problem();
+    }
+    return result;
 }
+
+// Writes documents, or the values at the pointer, onto one output as they are parsed.
+class Output {
+  public:
+    // `keeps_cut_text`: whether text written goes out for good (standard output, a device),
+    // not into a file that a failure discards.
+    Output(const Settings& settings, int descriptor, std::string destination, bool keeps_cut_text)
+        : settings(settings), destination(std::move(destination)), keeps_cut_text(keeps_cut_text),
+          buffer(descriptor), stream(&buffer) {}
+
+    // Parses one document with `parse`, called with the handler of its events, and writes it
+    // and a newline (nothing with --check). A document that fails is taken back, unless more
+    // of its text than the buffer holds went out: then the text up to the failure stays,
+    // ended by a newline, and the result says so.
+    template <typename Parse>
+    DocumentResult document(Parse&& parse) {
+        buffer.begin_document();
+        DocumentResult result;
+        try {
+            result = settings.check_only ? check(parse) : write(parse);
+        } catch (const std::invalid_argument& error) { // --ascii and a string that is not UTF-8
+            result.unwritable = error.what();
+        } catch (...) {
+            buffer.abandon_document();
+            throw;
+        }
+        if (!result.written() && !buffer.abandon_document()) {
+            stream.put('\n');
+            result.cut = keeps_cut_text;
+        }
+        return result;
+    }
+
+    const std::string& name() const { return destination; }
+
+    // Hands on what is written so far, so that a message that follows comes after it where
+    // both go to one terminal. A failure is kept for finish() to report.
+    void flush() { buffer.finish(); }
+
+    // Hands everything written on; false (after saying why) when writing failed.
+    bool finish() {
+        if (!buffer.finish() || !stream) {
+            complain("writing " + destination + ": " + std::strerror(buffer.error()));
+            return false;
+        }
+        return true;
+    }
+
+  private:
+    template <typename Parse>
+    DocumentResult check(Parse& parse) {
+        Discard nothing;
+        return parse_into(settings, nothing, parse);
+    }
+
+    // The Writer goes before the document is taken back: it hands on what it holds.
+    template <typename Parse>
+    DocumentResult write(Parse& parse) {
+        json::Writer writer(stream, settings.write_options);
+        DocumentResult result;
+        if (settings.sort_keys) {
+            jsonfmt::KeySorter sorter(writer);
+            result = parse_into(settings, sorter, parse);
+        } else {
+            result = parse_into(settings, writer, parse);
+        }
+        if (result.written()) {
+            stream.put('\n');
+        }
+        return result;
+    }
+
+    const Settings& settings;
+    std::string destination;
+    bool keeps_cut_text;
+    jsonfmt::DescriptorBuffer buffer;
+    std::ostream stream;
+};
+
+// Whether a comment the options let through would be lost: --in-place replaces the file with
+// text that has none, and only --lossy allows that.
+bool comments_must_survive(const Settings& settings) {
+    return settings.in_place && settings.parse_options.allow_comments && !settings.lossy;
+}
+
+// Says where a parse failed and why, and shows the line; `line` is the line the text starts on.
+template <typename Source>
+void report_located(const Source& source, const std::string& name, std::size_t line,
+                    const json::ParseReport& report, const std::string& message) {
+    std::fprintf(stderr, "%s:%zu:%zu: error: %s\n", name.c_str(), line + report.line - 1,
+                 report.column, message.c_str());
+    source.show(report);
+}
+
+// Reports a failed parse. Where comments must survive, the text was parsed without them: if
+// it parses with them, the only difference, a comment, is where the first parse failed.
+template <typename Source>
+void report_parse_failure(const Source& source, const std::string& name, std::size_t line,
+                          const json::ParseReport& report, const Settings& settings) {
+    if (!comments_must_survive(settings)) {
+        report_located(source, name, line, report, jsonfmt::failure_message(report));
+        return;
+    }
+    auto again = source.again();
+    Discard nothing;
+    const json::ParseReport with_comments = again.parse(nothing, settings.parse_options);
+    if (with_comments) {
+        report_located(source, name, line, report,
+                       "--in-place would drop this comment (add --lossy to allow that)");
+    } else {
+        report_located(again, name, line, with_comments, jsonfmt::failure_message(with_comments));
+    }
+}
+
+// Formats one document of `source`: the whole of `name`, or its line `line` (0 for a whole
+// file), reporting what went wrong.
+template <typename Source>
+ExitStatus format_source(Source& source, const std::string& name, std::size_t line,
+                         const Settings& settings, Output& output) {
+    json::ParseOptions options = settings.parse_options;
+    options.allow_comments = options.allow_comments && !comments_must_survive(settings);
+    const DocumentResult result =
+        output.document([&](auto& handler) { return source.parse(handler, options); });
+    if (result.written()) {
+        return VALID;
+    }
+    output.flush();
+    const std::string where = line == 0 ? name : name + ":" + std::to_string(line);
+    ExitStatus status = INVALID;
+    if (source.error() != 0) {
+        complain(name + ": " + std::strerror(source.error()));
+        status = TROUBLE;
+    } else if (!result.report) {
+        report_parse_failure(source, name, std::max<std::size_t>(line, 1), result.report, settings);
+    } else if (!result.unwritable.empty()) {
+        std::fprintf(stderr, "%s: --ascii: %s\n", where.c_str(), result.unwritable.c_str());
+    } else {
+        std::fprintf(stderr, "%s: %s\n", where.c_str(), result.pointer_problem.c_str());
+    }
+    if (result.cut) {
+        complain(where + ": its text up to the failure went to " + output.name() + " already");
+    }
+    return status;
+}
+
+// The buffer getline(3) reads each line into, grown to the longest line and freed at the end.
+struct LineBuffer {
+    LineBuffer() = default;
+    ~LineBuffer() { std::free(data); } // NOLINT(cppcoreguidelines-no-malloc): getline's memory
+    LineBuffer(const LineBuffer&) = delete;
+    LineBuffer& operator=(const LineBuffer&) = delete;
+    char* data = nullptr;
+    std::size_t capacity = 0;
+};
 
 // An open input file (standard input for "-"), closed when it goes.
 struct Input {
@@ -82,214 +319,9 @@ struct Input {
     bool owned;
 };
 
-// The line holding the failure, cut to a window around it on long (minified) lines, and a
-// caret under the failing byte; tabs before the caret are kept so that it lines up. The line
-// is written byte for byte, NUL bytes included.
-void show_failure_line(std::string_view text, const json::ParseReport& report) {
-    constexpr std::size_t before = 60;
-    constexpr std::size_t after = 20;
-    const std::size_t line_start = report.offset - (report.column - 1);
-    std::size_t line_end = text.find('\n', line_start);
-    if (line_end == std::string_view::npos) {
-        line_end = text.size();
-    }
-    std::size_t from = line_start;
-    std::string shown;
-    if (report.offset - line_start > before) {
-        from = report.offset - before;
-        shown = "...";
-    }
-    const std::size_t to = std::min(line_end, report.offset + after);
-    std::string caret(shown.size(), ' ');
-    for (std::size_t i = from; i < report.offset; ++i) {
-        caret += text[i] == '\t' ? '\t' : ' ';
-    }
-    shown.append(text.substr(from, to - from)).append(to < line_end ? "...\n" : "\n");
-    shown.append(caret).append("^\n");
-    std::fwrite(shown.data(), 1, shown.size(), stderr);
-}
-
-// The parser's note with jsonfmt's flag in place of each library option it names. jsonfmt turns
-// exact_numbers and reject_duplicate_keys on by default, so "without" them is "with --lossy";
-// the other options are off by default, and the flag that turns each on takes its name.
-std::string with_flag_names(std::string note) {
-    static constexpr std::pair<std::string_view, std::string_view> OPTION_TO_FLAG[] = {
-        {"the allow_comments option", "--allow-comments"},
-        {"the allow_trailing_commas option", "--allow-trailing-commas"},
-        {"the allow_invalid_utf8 option", "--lossy"},
-        {"the allow_lone_surrogates option", "--lossy"},
-        {"without the exact_numbers option", "with --lossy"},
-        {"without the reject_duplicate_keys option", "with --lossy"},
-    };
-    for (const auto& [option, flag] : OPTION_TO_FLAG) {
-        if (const std::size_t at = note.find(option); at != std::string::npos) {
-            note.replace(at, option.size(), flag);
-        }
-    }
-    return note;
-}
-
-// Whether `refusal` is of text that is JSON, but that the document model would change.
-bool changes_valid_json(json::Refusal refusal) {
-    return refusal == json::Refusal::INEXACT_NUMBER || refusal == json::Refusal::DUPLICATE_KEY ||
-           refusal == json::Refusal::LONE_SURROGATE;
-}
-
-// What a failed parse is reported as. A refusal of bad UTF-8 or of valid JSON is said by its
-// note alone: the grammar's code that comes with it only approximates the reason.
-std::string failure_message(const json::ParseReport& report) {
-    json::ParseReport shown = report;
-    shown.note = with_flag_names(report.note);
-    if (changes_valid_json(report.refusal)) {
-        return "valid JSON, but jsonfmt would change it: " + shown.note;
-    }
-    return report.refusal == json::Refusal::INVALID_UTF8 ? shown.note : shown.message();
-}
-
-// A document that is not written: where (the parser's report) and why.
-struct Rejection {
-    json::ParseReport report;
-    std::string message;
-};
-
-// Whether a comment the options let through would be lost: --in-place replaces the file with
-// text that has none, and only --lossy allows that.
-bool comments_must_survive(const Settings& settings) {
-    return settings.in_place && settings.parse_options.allow_comments && !settings.lossy;
-}
-
-// Parses `text` into `document` as the settings ask; nothing when it parsed. Where comments
-// must survive, the text is parsed without them first (one parse when there are none), and
-// only when that fails with them: if that succeeds, the only difference between the two
-// parses, a comment, is where the first one failed.
-std::optional<Rejection> parse_document(std::string_view text, json::Value& document,
-                                        const Settings& settings) {
-    const bool guarding_comments = comments_must_survive(settings);
-    json::ParseOptions options = settings.parse_options;
-    options.allow_comments = options.allow_comments && !guarding_comments;
-    const json::ParseReport report = json::parse(text, document, options);
-    if (report) {
-        return std::nullopt;
-    }
-    if (!guarding_comments) {
-        return Rejection{report, failure_message(report)};
-    }
-    const json::ParseReport with_comments = json::parse(text, document, settings.parse_options);
-    if (!with_comments) {
-        return Rejection{with_comments, failure_message(with_comments)};
-    }
-    return Rejection{report, "--in-place would drop this comment (add --lossy to allow that)"};
-}
-
-// Writes parsed documents, or the values at the pointer, onto one output.
-class Writer {
-  public:
-    Writer(const Settings& settings, int descriptor, std::string destination)
-        : settings(settings), destination(std::move(destination)), buffer(descriptor),
-          stream(&buffer) {}
-
-    // Writes `document` (or its value at the pointer) and a newline. INVALID when the pointer
-    // finds nothing or --ascii cannot write a string, TROUBLE when writing fails.
-    ExitStatus write(const json::Value& document, const std::string& where) {
-        const json::Value* value = &document;
-        if (settings.has_pointer) {
-            try {
-                value = &document.at_pointer(settings.pointer);
-            } catch (const std::out_of_range& error) {
-                // The message starts with the pointer, up to the first step not found.
-                flush();
-                std::fprintf(stderr, "%s: no value at %s\n", where.c_str(), error.what());
-                return INVALID;
-            }
-        }
-        if (settings.check_only) {
-            return VALID;
-        }
-        try {
-            write_value(*value);
-        } catch (const std::invalid_argument& error) { // --ascii and a string that is not UTF-8
-            flush();
-            std::fprintf(stderr, "%s: --ascii: %s\n", where.c_str(), error.what());
-            return INVALID;
-        }
-        stream.put('\n');
-        return VALID;
-    }
-
-    // Hands on what is written so far, so that a message that follows comes after it where
-    // both go to one terminal. A failure is kept for finish() to report.
-    void flush() { buffer.finish(); }
-
-    // Hands everything written on; false (after saying why) when writing failed.
-    bool finish() {
-        if (!buffer.finish() || !stream) {
-            complain("writing " + destination + ": " + std::strerror(buffer.error()));
-            return false;
-        }
-        return true;
-    }
-
-  private:
-    // Writes `value` onto the stream. ASCII-only text fails on a string that is not UTF-8,
-    // which only --lossy lets in: then the text is made whole before any of it goes out, so
-    // that no half of it is written anywhere (streamed, it could not be taken back).
-    void write_value(const json::Value& value) {
-        const json::WriteOptions& options = settings.write_options;
-        if (options.ascii_only && settings.parse_options.allow_invalid_utf8) {
-            const std::string text = json::serialize(value, options);
-            stream.write(text.data(), static_cast<std::streamsize>(text.size()));
-        } else {
-            json::write(stream, value, options);
-        }
-    }
-
-    const Settings& settings;
-    std::string destination;
-    jsonfmt::DescriptorBuffer buffer;
-    std::ostream stream;
-};
-
-ExitStatus report_rejection(const std::string& where, std::string_view text,
-                            const Rejection& rejection, std::size_t line, Writer& writer) {
-    writer.flush();
-    const json::ParseReport& report = rejection.report;
-    std::fprintf(stderr, "%s:%zu:%zu: error: %s\n", where.c_str(), line + report.line - 1,
-                 report.column, rejection.message.c_str());
-    show_failure_line(text, report);
-    return INVALID;
-}
-
-// One document per file.
-ExitStatus format_document(const std::string& name, const std::string& shown_name,
-                           const Settings& settings, Writer& writer) {
-    std::string text;
-    {
-        const Input input(name);
-        if (input.file == nullptr || !read_all(input.file, text)) {
-            complain(shown_name + ": " + std::strerror(errno));
-            return TROUBLE;
-        }
-    }
-    json::Value document;
-    if (const auto rejection = parse_document(text, document, settings)) {
-        return report_rejection(shown_name, text, *rejection, 1, writer);
-    }
-    return writer.write(document, shown_name);
-}
-
-// The buffer getline(3) reads each line into, grown to the longest line and freed at the end.
-struct LineBuffer {
-    LineBuffer() = default;
-    ~LineBuffer() { std::free(data); } // NOLINT(cppcoreguidelines-no-malloc): getline's memory
-    LineBuffer(const LineBuffer&) = delete;
-    LineBuffer& operator=(const LineBuffer&) = delete;
-    char* data = nullptr;
-    std::size_t capacity = 0;
-};
-
 // JSON Lines: every line that is not blank is a document; memory follows the longest line.
 ExitStatus format_lines(const std::string& name, const std::string& shown_name,
-                        const Settings& settings, Writer& writer) {
+                        const Settings& settings, Output& output) {
     const Input input(name);
     if (input.file == nullptr) {
         complain(shown_name + ": " + std::strerror(errno));
@@ -300,19 +332,13 @@ ExitStatus format_lines(const std::string& name, const std::string& shown_name,
     ssize_t length = 0;
     for (std::size_t number = 1; (length = ::getline(&line.data, &line.capacity, input.file)) >= 0;
          ++number) {
-        std::string_view text(line.data, static_cast<std::size_t>(length));
-        if (!text.empty() && text.back() == '\n') {
-            text.remove_suffix(1);
+        LineSource source{std::string_view(line.data, static_cast<std::size_t>(length))};
+        if (!source.text.empty() && source.text.back() == '\n') {
+            source.text.remove_suffix(1);
         }
-        if (text.find_first_not_of(" \t\r") == std::string_view::npos) {
-            continue;
+        if (source.text.find_first_not_of(" \t\r") != std::string_view::npos) {
+            status = std::max(status, format_source(source, shown_name, number, settings, output));
         }
-        json::Value document;
-        const auto rejection = parse_document(text, document, settings);
-        const std::string where = shown_name + ":" + std::to_string(number);
-        status = std::max(status,
-                          rejection ? report_rejection(shown_name, text, *rejection, number, writer)
-                                    : writer.write(document, where));
     }
     // getline returns -1 at the end of the file and on a failure alike: only the end sets the
     // end-of-file flag. Running out of memory for a long line sets no flag at all, only errno.
@@ -320,19 +346,23 @@ ExitStatus format_lines(const std::string& name, const std::string& shown_name,
         if (errno == ENOMEM) {
             throw std::bad_alloc();
         }
-        writer.flush();
+        output.flush();
         complain(shown_name + ": " + std::strerror(errno));
         return TROUBLE;
     }
     return status;
 }
 
-ExitStatus format_file(const std::string& name, const Settings& settings, Writer& writer) {
+ExitStatus format_file(const std::string& name, const Settings& settings, Output& output) {
     const std::string shown_name = name == "-" ? "<stdin>" : name;
     try {
-        return settings.lines ? format_lines(name, shown_name, settings, writer)
-                              : format_document(name, shown_name, settings, writer);
+        if (settings.lines) {
+            return format_lines(name, shown_name, settings, output);
+        }
+        StreamSource source(name);
+        return format_source(source, shown_name, 0, settings, output);
     } catch (const std::bad_alloc&) {
+        output.flush();
         complain(shown_name + ": out of memory");
         return TROUBLE;
     }
@@ -341,12 +371,12 @@ ExitStatus format_file(const std::string& name, const Settings& settings, Writer
 // Formats each of `files` onto `descriptor`, handing each file's text on before the next
 // file's messages.
 ExitStatus format_files(const std::vector<std::string>& files, const Settings& settings,
-                        int descriptor, const std::string& destination) {
-    Writer writer(settings, descriptor, destination);
+                        int descriptor, const std::string& destination, bool keeps_cut_text) {
+    Output output(settings, descriptor, destination, keeps_cut_text);
     ExitStatus status = VALID;
     for (const std::string& name : files) {
-        status = std::max(status, format_file(name, settings, writer));
-        if (!writer.finish()) {
+        status = std::max(status, format_file(name, settings, output));
+        if (!output.finish()) {
             return TROUBLE;
         }
     }
@@ -359,7 +389,8 @@ ExitStatus replace(const std::string& target, jsonfmt::Replacement::Target kind,
                    const std::vector<std::string>& files, const Settings& settings) {
     try {
         jsonfmt::Replacement replacement(target, kind);
-        const ExitStatus status = format_files(files, settings, replacement.descriptor(), target);
+        const ExitStatus status =
+            format_files(files, settings, replacement.descriptor(), target, false);
         if (status == VALID) {
             replacement.commit();
         }
@@ -380,7 +411,7 @@ ExitStatus write_special_file(const std::string& name, const Settings& settings)
         complain(name + ": " + std::strerror(errno));
         return TROUBLE;
     }
-    ExitStatus status = format_files(settings.files, settings, descriptor, name);
+    ExitStatus status = format_files(settings.files, settings, descriptor, name, true);
     if (::close(descriptor) != 0) {
         complain("writing " + name + ": " + std::strerror(errno));
         status = TROUBLE;
@@ -413,12 +444,9 @@ bool is_one_of(const std::string& path, const std::vector<std::string>& files) {
     });
 }
 
-// By default nothing passes that the document model would change: a number a double cannot
-// hold exactly, a repeated member name (the model keeps one member), bytes that are not UTF-8
-// and unpaired surrogates. --lossy accepts them all as the library's lenient settings do.
+// Numbers and repeated member names pass through unchanged; what cannot is refused unless
+// --lossy accepts it: bytes that are not UTF-8 (copied), unpaired surrogates (U+FFFD).
 void choose_leniency(json::ParseOptions& options, bool lossy) {
-    options.exact_numbers = !lossy;
-    options.reject_duplicate_keys = !lossy;
     options.allow_invalid_utf8 = lossy;
     options.allow_lone_surrogates = lossy;
 }
@@ -450,9 +478,9 @@ void add_reading_options(CLI::App& app, Settings& settings) {
     app.add_flag("--allow-trailing-commas", settings.parse_options.allow_trailing_commas,
                  "accept one comma before ] or }, as in [1, 2,]");
     app.add_flag("--lossy", settings.lossy,
-                 "accept what the output cannot keep as written: 1e400 or 1234567890123456789 "
-                 "rounded to a double, {\"a\":1,\"a\":2} keeping the last member, \"\\ud800\" "
-                 "as U+FFFD, bytes that are not UTF-8 copied; with -i, comments dropped");
+                 "accept what cannot be written as it was read: bytes that are not UTF-8 "
+                 "(copied as they are), \"\\ud800\" (as U+FFFD); with -i, comments dropped. "
+                 "Numbers and repeated names need no flag: they are written as they are");
 }
 
 // Adds the options that say how the text is laid out.
@@ -482,13 +510,16 @@ void add_layout_options(CLI::App& app, Settings& settings) {
 
 // Fills `settings` from the command line; returns an exit status when the program is done.
 bool read_arguments(int argc, char** argv, Settings& settings, int& status) {
-    CLI::App app("Checks JSON documents and writes them pretty (2-space indentation, keys "
-                 "sorted) or compact.\nReads each FILE, or standard input when there is none "
-                 "or for \"-\".",
+    CLI::App app("Checks JSON documents and writes them pretty (2-space indentation) or "
+                 "compact,\nmembers, repeated names and numbers as they are.\nReads each FILE, "
+                 "or standard input when there is none or for \"-\".",
                  "jsonfmt");
     app.set_help_flag("-h,--help", "show this help and exit");
     add_layout_options(app, settings);
     add_reading_options(app, settings);
+    app.add_flag("--sort-keys", settings.sort_keys,
+                 "write each object's members in byte order of their names (holds each "
+                 "top-level object in memory)");
     app.add_flag("--check", settings.check_only,
                  "only check the documents, under the same rules; write nothing");
     app.add_flag("-l,--lines", settings.lines,
@@ -579,7 +610,7 @@ int run(const Settings& settings) {
         return status;
     }
     if (settings.output_path.empty() || settings.check_only) {
-        return format_files(settings.files, settings, STDOUT_FILENO, "standard output");
+        return format_files(settings.files, settings, STDOUT_FILENO, "standard output", true);
     }
     if (jsonfmt::is_special_file(settings.output_path)) {
         return write_special_file(settings.output_path, settings);

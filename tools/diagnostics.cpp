@@ -1,0 +1,70 @@
+#include "diagnostics.hpp"
+
+#include <algorithm>
+#include <cstdio>
+#include <utility>
+
+namespace jsonfmt {
+
+namespace {
+
+// The parser's note with jsonfmt's flag in place of each library option it names: each is off
+// by default, and the flag that turns it on takes its name.
+std::string with_flag_names(std::string note) {
+    static constexpr std::pair<std::string_view, std::string_view> OPTION_TO_FLAG[] = {
+        {"the allow_comments option", "--allow-comments"},
+        {"the allow_trailing_commas option", "--allow-trailing-commas"},
+        {"the allow_invalid_utf8 option", "--lossy"},
+        {"the allow_lone_surrogates option", "--lossy"},
+    };
+    for (const auto& [option, flag] : OPTION_TO_FLAG) {
+        if (const std::size_t at = note.find(option); at != std::string::npos) {
+            note.replace(at, option.size(), flag);
+        }
+    }
+    return note;
+}
+
+} // namespace
+
+// A refusal of bad UTF-8 or of an unpaired surrogate is said by its note alone: the grammar's
+// code that comes with it only approximates the reason. The surrogate is valid JSON, which
+// only a change (to U+FFFD) could write.
+std::string failure_message(const json::ParseReport& report) {
+    json::ParseReport shown = report;
+    shown.note = with_flag_names(report.note);
+    if (report.refusal == json::Refusal::LONE_SURROGATE) {
+        return "valid JSON, but jsonfmt would change it: " + shown.note;
+    }
+    return report.refusal == json::Refusal::INVALID_UTF8 ? shown.note : shown.message();
+}
+
+// The line is cut to a window around the failure on long (minified) lines, or where the text
+// at hand ends; tabs before the caret are kept so that it lines up. The line is written byte
+// for byte, NUL bytes included.
+void show_failure_line(std::string_view text, std::size_t start, const json::ParseReport& report) {
+    if (report.offset < start || report.offset > start + text.size()) {
+        return;
+    }
+    const std::size_t failure = report.offset - start;
+    const std::size_t line_start = report.offset - (report.column - 1);
+    // Where the window starts in `text`: the line's start, or a point after it ("...").
+    std::size_t from = failure - std::min(failure, SHOWN_BEFORE);
+    std::string shown;
+    if (line_start >= start + from) {
+        from = line_start - start;
+    } else {
+        shown = "...";
+    }
+    const std::size_t line_end = std::min(text.find('\n', failure), text.size());
+    const std::size_t to = std::min(line_end, failure + SHOWN_AFTER);
+    std::string caret(shown.size(), ' ');
+    for (std::size_t i = from; i < failure; ++i) {
+        caret += text[i] == '\t' ? '\t' : ' ';
+    }
+    shown.append(text.substr(from, to - from)).append(to < line_end ? "...\n" : "\n");
+    shown.append(caret).append("^\n");
+    std::fwrite(shown.data(), 1, shown.size(), stderr);
+}
+
+} // namespace jsonfmt

@@ -1,0 +1,30 @@
+#ifndef JSONFMT_DIAGNOSTICS_HPP
+#define JSONFMT_DIAGNOSTICS_HPP
+
+// How jsonfmt words a failed parse and shows where it failed.
+
+#include <json/parse.hpp>
+
+#include <cstddef>
+#include <string>
+#include <string_view>
+
+namespace jsonfmt {
+
+/// How much of the failing line is shown before and after the failing byte.
+constexpr std::size_t SHOWN_BEFORE = 60;
+constexpr std::size_t SHOWN_AFTER = 20;
+
+/// What a failed parse is reported as, with jsonfmt's flags in place of the library's options.
+std::string failure_message(const json::ParseReport& report);
+
+/// Writes the line holding the failure onto standard error with a caret under the failing
+/// byte, from `text`, the part of the input that starts at offset `start` and is still at
+/// hand: at least from SHOWN_BEFORE bytes before the failure to SHOWN_AFTER + 1 after it
+/// (the one more tells whether the line goes on), for the whole window to be shown. A line cut
+/// short on either side is marked "..."; nothing is shown when the failure lies outside `text`.
+void show_failure_line(std::string_view text, std::size_t start, const json::ParseReport& report);
+
+} // namespace jsonfmt
+
+#endif
