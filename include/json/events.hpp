@@ -33,15 +33,15 @@ namespace json {
 /// A handler that accepts every event and keeps nothing. Derive from it and declare only the
 /// events you want: the parser calls them by name, so yours hide these (nothing is virtual).
 struct NoOpHandler {
-    bool null() { return true; }
-    bool boolean(bool) { return true; }
-    bool number(std::string_view) { return true; }
-    bool string(std::string_view) { return true; }
-    bool key(std::string_view) { return true; }
-    bool begin_array() { return true; }
-    bool end_array() { return true; }
-    bool begin_object() { return true; }
-    bool end_object() { return true; }
+    bool null() { return true; }                   ///< Accepts null.
+    bool boolean(bool) { return true; }            ///< Accepts true or false.
+    bool number(std::string_view) { return true; } ///< Accepts a number's literal.
+    bool string(std::string_view) { return true; } ///< Accepts a string.
+    bool key(std::string_view) { return true; }    ///< Accepts a member name.
+    bool begin_array() { return true; }            ///< Accepts an array's beginning.
+    bool end_array() { return true; }              ///< Accepts an array's end.
+    bool begin_object() { return true; }           ///< Accepts an object's beginning.
+    bool end_object() { return true; }             ///< Accepts an object's end.
 };
 
 namespace detail {

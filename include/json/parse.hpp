@@ -82,7 +82,8 @@ struct ParseOptions {
     /// overlong forms, encoded surrogates, code points above U+10FFFF, stray continuation
     /// bytes and sequences cut short are refused.
     bool allow_invalid_utf8 = false;
-    /// Turn a \u escape of an unpaired surrogate (U+D800 to U+DFFF) into U+FFFD. Off: refused.
+    /// Turn a `\u` escape of an unpaired surrogate (U+D800 to U+DFFF) into U+FFFD. Off:
+    /// refused.
     bool allow_lone_surrogates = false;
     /// Refuse an object that names a member twice. Off: the last member of that name wins.
     bool reject_duplicate_keys = false;

@@ -66,8 +66,11 @@ class JSONVALUE_API Writer {
     bool string(std::string_view utf8);
     /// The name of the next member of the innermost open object. Linear in its length.
     bool key(std::string_view utf8);
+    /// Opens an array.
     bool begin_array();
+    /// Closes the innermost open array.
     bool end_array();
+    /// Opens an object.
     bool begin_object();
     /// Closes the innermost open object; throws std::logic_error when a member name was given
     /// without its value.
