@@ -150,6 +150,19 @@ expect lines-refused 1 '[1]' "$work/refused.jsonl:2:8: error: $would_change \\ud
 { printf '["'; head -c 100000 /dev/zero | tr '\0' x; printf '", "\xff"]'; } >"$work/latin1.json"
 expect ascii-not-utf8 1 "$compact" "$work/latin1.json: --ascii: json: byte 0 of a string is not well-formed UTF-8, which ASCII-only text cannot write" -- --lossy --ascii -c "$work/doc.json" "$work/latin1.json"
 
+# --sort-keys: members in byte order of their names (é, 0xc3, after z), the same names in
+# their order, literals kept; the text is the one the same members written in order give
+printf '{"b": {"y": [1, {"d": 1, "c": 2}], "x": null}, "\xc3\xa9": 1, "z": 2, "a": 1e400, "a": 1.50, "B": []}' >"$work/unsorted.json"
+printf '{"B": [], "a": 1e400, "a": 1.50, "b": {"x": null, "y": [1, {"c": 2, "d": 1}]}, "z": 2, "\xc3\xa9": 1}' >"$work/presorted.json"
+for layout in "" -c --library-layout --tab --ascii; do
+    "$jsonfmt" $layout "$work/presorted.json" >"$work/sorted.expected"
+    "$jsonfmt" --sort-keys $layout "$work/unsorted.json" >"$work/sorted"
+    check "sort-keys: ${layout:-pretty}" cmp -s "$work/sorted.expected" "$work/sorted"
+done
+expect sort-keys-array 0 '[{"a":2,"b":1},3,{"c":3,"d":[{"e":2,"f":1}]}]' "" -- -c --sort-keys <(printf '[{"b":1,"a":2},3,{"d":[{"f":1,"e":2}],"c":3}]')
+expect sort-keys-lines 0 $'{"a":2,"b":1}\n[{"a":[],"b":{}}]' "" -- -l --sort-keys <(printf '{"b":1,"a":2}\n[{"b":{},"a":[]}]\n')
+expect sort-keys-pointer 0 '{"c":2,"d":1}' "" -- -c --sort-keys -p /b/y/1 "$work/unsorted.json"
+
 # --pointer
 expect pointer-compact 0 '[1,{}]' "" -- -c -p /b "$work/doc.json"
 expect pointer-pretty 0 $'[\n  1,\n  {}\n]' "" -- --pointer /b "$work/doc.json"
@@ -157,6 +170,25 @@ expect pointer-empty 0 "$compact" "" -- -c -p "" "$work/doc.json"
 expect pointer-missing 1 '[1,{}]' "$work/other.json: no value at /b: no member \"b\"" -- -c -p /b "$work/other.json" "$work/doc.json"
 expect pointer-malformed 2 "" "jsonfmt: --pointer: JSON Pointer \"b\" does not start with '/' (try --help)" -- -p b "$work/doc.json"
 expect pointer-bad-escape 2 "" "jsonfmt: --pointer: JSON Pointer \"/a~2\" has a '~' not followed by '0' or '1' (try --help)" -- -p /a~2 "$work/doc.json"
+
+# --pointer follows the path through the events: each way it can leave the document is said
+# as json::Value::at_pointer says it, and a name the path takes twice is ambiguous
+printf '{"a": {"y": 1}, "b": [1, 2], "c": "s", "d": [{"e": 1}, {"e": 2}], "f": 0, "f": {"g": 1}, "~/": 5}' >"$work/path.json"
+for miss in '/a/x|no value at /a/x: no member "x"' '/b/5|no value at /b/5: index 5 out of range for a JSON array of 2 elements' \
+    '/b/x|no value at /b/x: "x" is no index of a JSON array' '/b/-|no value at /b/-: "-" is no index of a JSON array' \
+    '/b/01|no value at /b/01: "01" is no index of a JSON array' '/c/d|no value at /c/d: expected JSON object or array, found JSON string' \
+    '/f/g|no single value at /f: the object has more than one member "f"' \
+    '/b/99999999999999999999999|no value at /b/99999999999999999999999: index 99999999999999999999999 out of range for a JSON array of 2 elements'; do
+    expect "pointer-miss ${miss%%|*}" 1 "" "$work/path.json: ${miss#*|}" -- -c -p "${miss%%|*}" "$work/path.json"
+done
+for hit in '/d/1/e|2' '/d/1|{"e":2}' '/~0~1|5' '/a|{"y":1}'; do
+    expect "pointer-hit ${hit%%|*}" 0 "${hit#*|}" "" -- -c -p "${hit%%|*}" "$work/path.json"
+done
+expect pointer-check 1 "" "$work/path.json: no value at /a/x: no member \"x\"" -- --check -p /a/x "$work/path.json"
+# The rest of the document is read after the value is written: a later error still counts
+expect pointer-then-invalid 1 "" "$work/bad.json:3:4: error: No trailing ']' while parsing value of type array (possible missing comma?)
+	2 3]
+	  ^" -- -c -p /a/0 "$work/bad.json"
 
 # --lines: blank lines skipped, the last line has no newline; a bad line gets its own column
 expect lines 0 $'{"a":1}\n[1,2]\n{"b":{"c":3}}\n"last"' "" -- --lines "$work/good.jsonl"
@@ -166,6 +198,51 @@ expect lines-check 1 "" "$lines_error" -- -l --check "$work/bad.jsonl"
 "$jsonfmt" -l "$work/bad.jsonl" >"$work/both" 2>&1
 check lines-in-order [ "$(cat "$work/both")" = $'[1]\n'"$lines_error"$'\n{"b":2}' ]
 expect lines-pointer 1 $'1\n[2]' "$work/pointer.jsonl:2: no value at /b: no member \"b\"" -- -l -p /b "$work/pointer.jsonl"
+
+# A failure far into a stream is shown from the pieces read last, from a file and from a
+# pipe alike: on a long line a window around it, "..." where the line goes on; on a later
+# line that line, counted across the pieces
+{ printf '['; yes '1,' | head -n 150000 | tr -d '\n'; printf 'x, 2, 3, 4, 5, 6, 7, 8, 9]'; } >"$work/long-line.json"
+{ printf '[\n'; yes '1,' | head -n 100000; printf '  x]\n'; } >"$work/many-lines.json"
+from_pipe=(bash -c 'cat "$1" | "$0" -c -' )
+window="$(printf '1,%.0s' $(seq 30))"
+expect stream-long-line 1 "" "$work/long-line.json:1:300002: $no_digit
+...${window}x, 2, 3, 4, 5, 6, 7,...
+$(printf '%63s')^" -- "$work/long-line.json"
+expect stream-long-line-pipe 1 "" "<stdin>:1:300002: $no_digit
+...${window}x, 2, 3, 4, 5, 6, 7,...
+$(printf '%63s')^" "${from_pipe[@]}" -- "$work/long-line.json"
+expect stream-later-line-pipe 1 "" "<stdin>:100002:3: $no_digit
+  x]
+  ^" "${from_pipe[@]}" -- "$work/many-lines.json"
+
+# A document that fails is taken back whole while its text fits the 1 MiB output buffer (the
+# cases above); a longer one has gone out in part: its text up to the failure stays, ended by
+# a newline, and the message says so. Into a file (-o) nothing of it is written.
+# cut_short FILE: FILE holds the compact text of cut-*.json up to the failure, and a newline
+cut_short() {
+    [ "$(head -c 14 "$1")" = '["abcdefghij",' ] && tail -c 13 "$1" | cmp -s - <(printf '"abcdefghij"\n') &&
+        [ "$(wc -c <"$1")" = 1560001 ]
+}
+for ending in 'parse|x]' $'ascii|"\xff"]'; do
+    { printf '['; yes '"abcdefghij",' | head -n 120000 | tr -d '\n'; printf '%s' "${ending#*|}"; } >"$work/cut-${ending%%|*}.json"
+done
+for cut in "parse||$work/cut-parse.json:1:1560002: $no_digit
+...$(tail -c 62 "$work/cut-parse.json")
+$(printf '%63s')^" \
+    "ascii|--lossy --ascii|$work/cut-ascii.json: --ascii: json: byte 0 of a string is not well-formed UTF-8, which ASCII-only text cannot write"; do
+    IFS='|' read -r -d '' name flags message <<<"$cut"
+    message=${message%$'\n'}
+    file="$work/cut-$name.json"
+    "$jsonfmt" -c $flags "$file" >"$work/out" 2>"$work/err"
+    check "cut-$name-status" [ $? = 1 ]
+    check "cut-$name-text" cut_short "$work/out"
+    check "cut-$name-said" [ "$(cat "$work/err")" = "$message
+jsonfmt: $file: its text up to the failure went to standard output already" ]
+    printf 'old' >"$work/kept.json"
+    expect "cut-$name-output-kept" 1 "" "$message" -- -c $flags -o "$work/kept.json" "$file"
+    check "cut-$name-output-untouched" [ "$(cat "$work/kept.json")" = old ]
+done
 
 # --output
 expect output 0 "" "" -- -o "$work/written.json" "$work/doc.json"
@@ -342,6 +419,39 @@ else
     expect lines-out-of-memory 2 "" "jsonfmt: $work/long/long.jsonl: out of memory" bash -c 'ulimit -v 30000 && exec "$0" "$@"' -- -l -c -i "$work/long/long.jsonl"
     check lines-out-of-memory-kept cmp -s "$work/long.jsonl" "$work/long/long.jsonl"
     check lines-out-of-memory-nothing-left same_listing "$work/long" long.jsonl
+fi
+
+# Constant memory while streaming: a 300 MB document of records (literals and repeated names
+# passed through) formatted and checked within 64 MB of resident memory, from a file and from
+# a pipe. Release builds only: sanitizers and debug code are too slow and too large for it.
+if [ "$mode" = sanitized ]; then
+    skip "stream-300MB: needs a release build"
+else
+    record='{"id": 1234567890123456789, "name": "user", "tags": [1.50, 2e400, "x"], "id": 1},'
+    count=3700000
+    { printf '['; yes "$record" | head -n "$count" | tr -d '\n'; printf '0]'; } >"$work/huge.json"
+    spaces=${record//[^ ]/}
+    compact_bytes=$(($(wc -c <"$work/huge.json") - ${#spaces} * count + 1))
+    # huge SOURCE FLAG: the size of jsonfmt FLAG's output for huge.json read from SOURCE (file or
+    # pipe); its resident memory is left in $work/rss
+    huge() {
+        if [ "$1" = pipe ]; then
+            cat "$work/huge.json" | /usr/bin/time -f %M -o "$work/rss" "$jsonfmt" "$2" - | wc -c
+        else
+            /usr/bin/time -f %M -o "$work/rss" "$jsonfmt" "$2" "$work/huge.json" | wc -c
+        fi
+    }
+    for source in file pipe; do
+        for flag in -c --check; do
+            bytes=$(huge "$source" "$flag")
+            check "stream-300MB $flag from a $source: status" [ $? = 0 ]
+            expected=$compact_bytes
+            [ "$flag" = --check ] && expected=0
+            check "stream-300MB $flag from a $source: $bytes bytes" [ "$bytes" = "$expected" ]
+            check "stream-300MB $flag from a $source: $(cat "$work/rss") KB resident" [ "$(cat "$work/rss")" -le 65536 ]
+        done
+    done
+    rm "$work/huge.json"
 fi
 
 # --help names every option

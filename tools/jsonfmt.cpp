@@ -63,19 +63,6 @@ void complain(const std::string& message) {
     std::fprintf(stderr, "jsonfmt: %s\n", message.c_str());
 }
 
-// A handler that takes every event and keeps nothing: --check reads with it.
-struct Discard {
-    bool null() { return true; }
-    bool boolean(bool) { return true; }
-    bool number(std::string_view) { return true; }
-    bool string(std::string_view) { return true; }
-    bool key(std::string_view) { return true; }
-    bool begin_array() { return true; }
-    bool end_array() { return true; }
-    bool begin_object() { return true; }
-    bool end_object() { return true; }
-};
-
 // A whole file, or standard input, read in pieces: memory does not follow its length.
 class StreamSource {
   public:
@@ -200,7 +187,7 @@ class Output {
   private:
     template <typename Parse>
     DocumentResult check(Parse& parse) {
-        Discard nothing;
+        json::NoOpHandler nothing;
         return parse_into(settings, nothing, parse);
     }
 
@@ -253,7 +240,7 @@ void report_parse_failure(const Source& source, const std::string& name, std::si
         return;
     }
     auto again = source.again();
-    Discard nothing;
+    json::NoOpHandler nothing;
     const json::ParseReport with_comments = again.parse(nothing, settings.parse_options);
     if (with_comments) {
         report_located(source, name, line, report,
