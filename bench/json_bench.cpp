@@ -1,13 +1,16 @@
 // Compares jsonvalue with nlohmann-json, jsoncpp, RapidJSON, Boost.JSON and simdjson on three
-// documents: compact and pretty writing into a std::string, parsing into the document model,
-// deep copying, destruction, and the heap held by a parsed document. simdjson takes part in
-// parsing and compact writing only: its DOM is read-only, so there is nothing to copy.
-// jsonvalue's own writing with the common two-space layout, and its event writer against
-// RapidJSON's, both fed the events of one walk over a parsed jsonvalue document, are measured
-// too; so are validation without building anything (against RapidJSON's Reader with a handler
-// that does nothing and UTF-8 validation, and nlohmann's SAX parser with such a handler), and
-// parsing with exact numbers against the default parse, on canada.json as jsonvalue writes it
-// (as it comes, most of its numbers have more digits than a double keeps, so it is refused).
+// classes of documents (the three large bench documents; five small ones of 84 bytes to 1 KB,
+// in bench/documents; two number-heavy ones made here, a GeoJSON collection with long
+// coordinate arrays and a mesh of short floats and integers): compact and pretty writing into a
+// std::string, parsing into the document model, deep copying, destruction, and the heap held by a
+// parsed document. simdjson takes part in parsing and compact writing only: its DOM is read-only,
+// so there is nothing to copy. jsonvalue's own writing with the common two-space layout, and its
+// event writer against RapidJSON's, both fed the events of one walk over a parsed jsonvalue
+// document, are measured too; so are validation without building anything (against RapidJSON's
+// Reader with a handler that does nothing and UTF-8 validation, and nlohmann's SAX parser with such
+// a handler), and parsing with exact numbers against the default parse, on canada.json as jsonvalue
+// writes it (as it comes, most of its numbers have more digits than a double keeps, so it is
+// refused).
 #include <json/json.hpp>
 
 #include <benchmark/benchmark.h>
@@ -22,6 +25,8 @@
 #include <rapidjson/writer.h>
 #include <simdjson.h>
 
+#include <cstdint>
+#include <cstdio>
 #include <fstream>
 #include <memory>
 #include <sstream>
@@ -447,21 +452,95 @@ void register_exact_parse(const std::string& document_name, const std::string& w
     }
 }
 
+// A fixed sequence of numbers in [0, 1), the same on every run.
+class Sequence {
+  public:
+    double next() {
+        state = state * 6364136223846793005U + 1442695040888963407U;
+        return static_cast<double>(state >> 11U) / 9007199254740992.0;
+    }
+
+  private:
+    std::uint64_t state = 2026;
+};
+
+void append_number(std::string& text, const char* format, double value) {
+    char buffer[32];
+    text.append(buffer,
+                static_cast<std::size_t>(std::snprintf(buffer, sizeof buffer, format, value)));
+}
+
+// A GeoJSON FeatureCollection of 150 tracks of 600 points each, coordinates with seven
+// decimals as mapping tools write them: about 2 MB.
+std::string geojson_tracks() {
+    Sequence random;
+    std::string text = R"({"type":"FeatureCollection","features":[)";
+    for (int track = 0; track < 150; ++track) {
+        text += track == 0 ? "" : ",";
+        text += R"({"type":"Feature","properties":{"id":)" + std::to_string(track) +
+                R"(,"name":"track )" + std::to_string(track) +
+                R"("},"geometry":{"type":"LineString","coordinates":[)";
+        double longitude = -120 + 240 * random.next();
+        double latitude = -60 + 120 * random.next();
+        for (int point = 0; point < 600; ++point) {
+            longitude += 0.001 * (random.next() - 0.5);
+            latitude += 0.001 * (random.next() - 0.5);
+            text += point == 0 ? "[" : ",[";
+            append_number(text, "%.7f", longitude);
+            text += ',';
+            append_number(text, "%.7f", latitude);
+            text += ']';
+        }
+        text += "]}}";
+    }
+    return text + "]}";
+}
+
+// A triangle mesh: vertex positions and normals as short floats, faces as integers, as 3D
+// exporters write them: about 1 MB.
+std::string mesh() {
+    Sequence random;
+    constexpr int vertices = 20000;
+    const auto floats = [&](const char* name, double scale) {
+        std::string part = std::string("\"") + name + "\":[";
+        for (int i = 0; i < 3 * vertices; ++i) {
+            part += i == 0 ? "" : ",";
+            append_number(part, "%.4g", scale * (random.next() - 0.5));
+        }
+        return part + "]";
+    };
+    std::string text = "{" + floats("positions", 20) + "," + floats("normals", 2) + ",\"faces\":[";
+    for (int i = 0; i < 2 * 3 * vertices; ++i) {
+        text += (i == 0 ? "" : ",") + std::to_string(static_cast<int>(random.next() * vertices));
+    }
+    return text + "],\"material\":\"steel\"}";
+}
+
+void register_document(const std::string& name, const std::string& text) {
+    register_library<JsonValue>(name, text);
+    register_library<Nlohmann>(name, text);
+    register_library<JsonCpp>(name, text);
+    register_library<RapidJson>(name, text);
+    register_library<BoostJson>(name, text);
+    register_library<SimdJson>(name, text);
+}
+
 } // namespace
 
 int main(int argc, char** argv) {
     benchmark::Initialize(&argc, argv);
     for (const char* name : {"twitter", "citm_catalog", "canada"}) {
         const std::string text = read_file(std::string(JSON_BENCH_DATA_DIR) + "/" + name + ".json");
-        register_library<JsonValue>(name, text);
-        register_library<Nlohmann>(name, text);
-        register_library<JsonCpp>(name, text);
-        register_library<RapidJson>(name, text);
-        register_library<BoostJson>(name, text);
-        register_library<SimdJson>(name, text);
+        register_document(name, text);
         register_layouts_and_events(name, text);
         register_validation(name, text);
     }
+    for (const char* name : {"rpc_call", "log_event", "geo_feature", "api_page", "package"}) {
+        register_document(name,
+                          read_file(std::string(JSON_BENCH_DOCUMENTS_DIR) + "/" + name + ".json"));
+    }
+    register_document("geojson_tracks", geojson_tracks());
+    register_document("mesh", mesh());
     register_exact_parse("canada_written",
                          json::serialize(*JsonValue::parse(
                              read_file(std::string(JSON_BENCH_DATA_DIR) + "/canada.json"))));
