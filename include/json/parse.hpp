@@ -236,7 +236,8 @@ inline ParseReport parse(std::string_view text, Value& out, const ParseOptions& 
 /// threw, failbit when it was not readable. Exceptions the caller enabled on the stream for
 /// those bits propagate, except that with badbit enabled the buffer's own exception passes on
 /// (not std::ios::failure), as from the standard input functions. Throws std::bad_alloc.
-/// Memory: the whole text is held at once.
+/// Memory: the document and a piece of 64 KiB of the text (with the longest token), never the
+/// whole text; the text is read in pieces as json::parse_events reads it.
 JSONVALUE_API ParseReport parse(std::istream& in, Value& out, const ParseOptions& options);
 
 /// Parses as above with the default options and returns the code alone.
