@@ -456,7 +456,7 @@ fi
 
 # --help names every option
 for option in -h,--help -c,--compact '--indent N' --tab --ascii --library-layout --allow-comments \
-    --allow-trailing-commas --lossy --check -l,--lines '-p,--pointer PTR' '-o,--output FILE' \
+    --allow-trailing-commas --lossy --sort-keys --check -l,--lines '-p,--pointer PTR' '-o,--output FILE' \
     -i,--in-place '--max-depth N' --version 'Usage: jsonfmt'; do
     check "help: $option" grep -qF -- "$option" <("$jsonfmt" --help)
 done
