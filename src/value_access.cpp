@@ -44,20 +44,6 @@ void check_pointer(std::string_view pointer) {
     }
 }
 
-// The member name a checked token stands for: "~1" is '/', "~0" is '~'.
-std::string member_name(std::string_view token) {
-    std::string name;
-    name.reserve(token.size());
-    for (std::size_t i = 0; i < token.size(); ++i) {
-        if (token[i] == '~') {
-            name += token[++i] == '0' ? '~' : '/';
-        } else {
-            name += token[i];
-        }
-    }
-    return name;
-}
-
 // Whether a token names an element: "0", or digits without a leading zero, of any length ("-",
 // the element after the last, never exists here).
 bool is_index(std::string_view token) {
@@ -76,7 +62,7 @@ Value* element(Array& items, std::string_view index) {
 
 Value* child(Value& parent, std::string_view token) {
     if (parent.is_object()) {
-        return parent.find(member_name(token));
+        return parent.find(detail::pointer_member_name(token));
     }
     if (parent.is_array() && is_index(token)) {
         return element(boost::get<Array>(parent), token);
@@ -112,7 +98,7 @@ Resolution resolve(Value& root, std::string_view pointer) {
 // Why `token` is not found in `parent`.
 std::string not_found(const Value& parent, std::string_view token) {
     if (parent.is_object()) {
-        return "no member \"" + member_name(token) + "\"";
+        return "no member \"" + detail::pointer_member_name(token) + "\"";
     }
     if (parent.is_array()) {
         if (!is_index(token)) {
@@ -125,6 +111,19 @@ std::string not_found(const Value& parent, std::string_view token) {
 }
 
 } // namespace
+
+std::string detail::pointer_member_name(std::string_view token) {
+    std::string name;
+    name.reserve(token.size());
+    for (std::size_t i = 0; i < token.size(); ++i) {
+        if (token[i] == '~') {
+            name += token[++i] == '0' ? '~' : '/';
+        } else {
+            name += token[i];
+        }
+    }
+    return name;
+}
 
 bool Value::as_bool() const {
     return checked<bool>(const_cast<Value&>(*this), detail::BOOL_INDEX);

@@ -1,24 +1,13 @@
 #include "pointer_filter.hpp"
 
+#include <json/value.hpp>
+
 #include <charconv>
 #include <utility>
 
 namespace jsonfmt {
 
 namespace {
-
-// The member name a token stands for: "~1" is '/', "~0" is '~'.
-std::string member_name(std::string_view token) {
-    std::string name;
-    for (std::size_t i = 0; i < token.size(); ++i) {
-        if (token[i] == '~') {
-            name += token[++i] == '0' ? '~' : '/';
-        } else {
-            name += token[i];
-        }
-    }
-    return name;
-}
 
 // The element a token names: "0", or digits without a leading zero; npos for any other token
 // ("-", the element after the last, never exists) and for one beyond std::size_t, which no
@@ -59,7 +48,8 @@ PointerPath::PointerPath(std::string_view pointer) : pointer(pointer) {
     for (std::size_t start = 0; start < pointer.size();) {
         const std::size_t end = std::min(pointer.find('/', start + 1), pointer.size());
         const std::string_view token = pointer.substr(start + 1, end - start - 1);
-        steps.push_back({std::string(token), member_name(token), element_index(token), end});
+        steps.push_back({std::string(token), json::detail::pointer_member_name(token),
+                         element_index(token), end});
         start = end;
     }
 }

@@ -61,6 +61,11 @@ enum Alternative : int {
 /// copy uses it to build a tree level by level instead of recursing.
 struct ShallowCopy {};
 
+/// The member name a reference token of a well-formed JSON Pointer stands for: "~1" is '/',
+/// "~0" is '~'. For whatever follows a pointer through a document (Value::find_pointer,
+/// jsonfmt's --pointer through parsing events). Linear. Throws std::bad_alloc.
+JSONVALUE_API std::string pointer_member_name(std::string_view token);
+
 } // namespace detail
 
 /// Display names of the types a Value deals in. `name` is defined, once for the whole process,
