@@ -243,53 +243,32 @@ TEST(ParseOptions, CommentsAndTrailingCommas) {
 // enough for the sixteen-byte scan and in a member name; refused at the first byte of the
 // ill-formed sequence, kept byte for byte with allow_invalid_utf8.
 TEST(ParseOptions, Utf8Boundaries) {
-    const std::pair<std::string, bool> sequences[] = {
-        {"\x7F", true},
-        {"\xC2\x80", true},
-        {"\xDF\xBF", true},
-        {"\xC1\xBF", false}, // overlong
-        {"\xC0\x80", false},
-        {"\xC2\x7F", false}, // cut short by an ASCII byte
-        {"\xC2\xC0", false},
-        {"\x80", false}, // a lone continuation byte
-        {"\xBF", false},
-        {"\xE0\xA0\x80", true},
-        {"\xE0\x9F\xBF", false}, // overlong
-        {"\xE0\xBF\xBF", true},
-        {"\xE1\x80\x80", true},
-        {"\xE1\xC0\x80", false}, // a second or third byte that is no continuation byte
-        {"\xE1\x80\xC0", false},
-        {"\xE1\x80\x7F", false},
-        {"\xDF\xC0", false},
-        {"\xEC\xBF\xBF", true},
-        {"\xED\x80\x80", true},
-        {"\xED\x9F\xBF", true},
-        {"\xED\xA0\x80", false}, // a surrogate
-        {"\xED\xBF\xBF", false},
-        {"\xEE\x80\x80", true},
-        {"\xEF\xBF\xBF", true},
-        {"\xEF\xBF", false}, // cut short by the closing quote
-        {"\xF0\x90\x80\x80", true},
-        {"\xF0\x8F\xBF\xBF", false}, // overlong
-        {"\xF1\x80\x80\x80", true},
-        {"\xF3\xBF\xBF\xBF", true},
-        {"\xF4\x80\x80\x80", true},
-        {"\xF4\x8F\xBF\xBF", true},  // U+10FFFF
-        {"\xF4\x90\x80\x80", false}, // above U+10FFFF
-        {"\xF5\x80\x80\x80", false},
-        {"\xFF", false},
-        {"\xF0\x90\x80", false}};
-    for (const auto& [bytes, well_formed] : sequences) {
-        for (const std::string& before : {std::string("ab"), std::string(20, 'a')}) {
-            for (const bool as_name : {false, true}) {
-                const std::string string = "\"" + before + bytes + "z\"";
-                const std::string text = as_name ? "{" + string + ":1}" : string;
-                const std::size_t offset = (as_name ? 2 : 1) + before.size();
-                const std::string stored = as_name ? "={" + string + ":1}" : "=" + string;
-                EXPECT_EQ(outcome(text, ""),
-                          well_formed ? stored : "@" + std::to_string(offset) + " #9 bad UTF-8")
-                    << string;
-                EXPECT_EQ(outcome(text, "u"), stored) << string;
+    // The lowest and highest sequence of each row of the table, separated by spaces.
+    const std::string well_formed =
+        "\x7F \xC2\x80 \xDF\xBF \xE0\xA0\x80 \xE0\xBF\xBF \xE1\x80\x80 \xEC\xBF\xBF \xED\x80\x80 "
+        "\xED\x9F\xBF \xEE\x80\x80 \xEF\xBF\xBF \xF0\x90\x80\x80 \xF1\x80\x80\x80 "
+        "\xF3\xBF\xBF\xBF \xF4\x80\x80\x80 \xF4\x8F\xBF\xBF";
+    // Overlong forms, lone and missing continuation bytes, a second or third byte that is no
+    // continuation byte, surrogates, above U+10FFFF, and sequences cut short by an ASCII byte
+    // or by the closing quote.
+    const std::string ill_formed =
+        "\xC1\xBF \xC0\x80 \xE0\x9F\xBF \xF0\x8F\xBF\xBF \x80 \xBF \xC2\xC0 \xDF\xC0 \xE1\xC0\x80 "
+        "\xE1\x80\xC0 \xE1\x80\x7F \xED\xA0\x80 \xED\xBF\xBF \xF4\x90\x80\x80 \xF5\x80\x80\x80 "
+        "\xFF \xC2\x7F \xEF\xBF \xF0\x90\x80";
+    for (const bool expected : {true, false}) {
+        std::istringstream sequences(expected ? well_formed : ill_formed);
+        for (std::string bytes; sequences >> bytes;) {
+            for (const std::string& before : {std::string("ab"), std::string(20, 'a')}) {
+                for (const bool as_name : {false, true}) {
+                    const std::string string = "\"" + before + bytes + "z\"";
+                    const std::string text = as_name ? "{" + string + ":1}" : string;
+                    const std::size_t offset = (as_name ? 2 : 1) + before.size();
+                    const std::string stored = as_name ? "={" + string + ":1}" : "=" + string;
+                    EXPECT_EQ(outcome(text, ""),
+                              expected ? stored : "@" + std::to_string(offset) + " #9 bad UTF-8")
+                        << string;
+                    EXPECT_EQ(outcome(text, "u"), stored) << string;
+                }
             }
         }
     }
@@ -330,49 +309,24 @@ TEST(ParseOptions, DuplicateKeys) {
 // The exact-number rule at its edges: 2^53, digit counts, subnormals, overflow, zeros, trailing
 // zeros and exponents.
 TEST(ParseOptions, ExactNumbers) {
-    const std::pair<std::string, bool> rows[] = {
-        {"9007199254740992", true}, // 2^53
-        {"9007199254740993", false},
-        {"9007199254740994", true},
-        {"-9007199254740993", false},
-        {"123456789012345", true},
-        {"0.123456789012345", true},
-        {"0.1234567890123456", true},
-        {"0.12345678901234567", false},
-        {"0.12345678901234566", true},
-        {"123456789012345.6", true},
-        {"1234567890123456.7", false},
-        {"0.1", true},
-        {"0.10000000000000001", false},
-        {"1.50", true},
-        {"1.500000000000000000000000", true},
-        {"100e-2", true},
-        {"1E2", true},
-        {"1e+2", true},
-        {"1e22", true},
-        {"1e23", true},
-        {"12345678901234500000", false},
-        {"12345678901234499584", true},
-        {"-0", true},
-        {"-0.0e5", true},
-        {"0e-999999999999", true},
-        {"2.2250738585072014e-308", true},
-        {"2.2250738585072011e-308", false},
-        {"2.225073858507201e-308", true},
-        {"5e-324", true},
-        {"4.9e-324", false},
-        {"1e-400", false},
-        {"1.7976931348623157e308", true},
-        {"1.7976931348623158e308", false},
-        {"1e400", false},
-        {"-65.61361699999998", true},   // a coordinate as the writer writes it
-        {"-65.613616999999977", false}, // and as another writer wrote it
-        {"0.0078125", true},
-        {"0.00390625000000000001", false},
-    };
-    for (const auto& [literal, exact] : rows) {
-        EXPECT_EQ(outcome(literal, "x"), exact ? outcome(literal, "") : "@0 #13 inexact")
-            << literal;
+    // Around 2^53, at 15, 16 and 17 digits, trailing zeros and exponents, zeros, the normal
+    // and subnormal limits, overflow, and a coordinate as this writer and another wrote it.
+    const std::string exact =
+        "9007199254740992 9007199254740994 123456789012345 0.123456789012345 0.1234567890123456 "
+        "0.12345678901234566 123456789012345.6 0.1 1.50 1.500000000000000000000000 100e-2 1E2 "
+        "1e+2 1e22 1e23 12345678901234499584 -0 -0.0e5 0e-999999999999 2.2250738585072014e-308 "
+        "2.225073858507201e-308 5e-324 1.7976931348623157e308 -65.61361699999998 0.0078125";
+    const std::string inexact =
+        "9007199254740993 -9007199254740993 0.12345678901234567 1234567890123456.7 "
+        "0.10000000000000001 12345678901234500000 2.2250738585072011e-308 4.9e-324 1e-400 "
+        "1.7976931348623158e308 1e400 -65.613616999999977 0.00390625000000000001";
+    std::istringstream written_back(exact);
+    for (std::string literal; written_back >> literal;) {
+        EXPECT_EQ(outcome(literal, "x"), outcome(literal, "")) << literal;
+    }
+    std::istringstream changed(inexact);
+    for (std::string literal; changed >> literal;) {
+        EXPECT_EQ(outcome(literal, "x"), "@0 #13 inexact") << literal;
     }
 }
 
