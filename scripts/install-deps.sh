@@ -13,6 +13,7 @@ packages=(
     doxygen valgrind                         # API reference; memcheck of the unit tests
     clang-14 libclang-rt-14-dev              # the fuzzers (libFuzzer, sanitizer runtimes)
     file dpkg-dev pkg-config                 # cpack -G DEB (file, dpkg-shlibdeps); the consumers
+    time                                     # jsonfmt's shell test measures resident memory
     "$@")
 
 missing=()
