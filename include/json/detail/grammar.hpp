@@ -47,10 +47,8 @@ class Grammar {
 
     /// How many bytes of the last piece were consumed.
     std::size_t consumed() const { return static_cast<std::size_t>(cursor - begin); }
-    /// Offsets from the start of the first piece: where a failure is, and where the token
-    /// being reported to the handler starts.
+    /// Where a failure is, counted from the start of the first piece.
     std::size_t failure_offset() const { return base + consumed(); }
-    std::size_t token_offset() const { return base + static_cast<std::size_t>(token - begin); }
     std::string take_note() { return std::move(failure_note); }
     Refusal refusal() const { return refused; }
 
