@@ -2,22 +2,23 @@
 
 namespace json::detail {
 
-void OutputBuffer::new_line_on_stream(std::size_t indent, char blank) {
-    if (!formatted) {
-        put(widened_newline);
-        fill(blank, indent);
-        return;
-    }
+void OutputBuffer::new_line_in_pieces(std::size_t indent, char blank) {
     if (!widened_newline_known) {
-        // widen() throws std::bad_cast for a locale without std::ctype<char>: the text so far
-        // must be on the stream by then. Once it has answered, its answer is reused.
-        flush();
-        widened_newline = out->widen('\n');
-        widened_newline_known = true;
+        if (formatted) {
+            // widen() throws std::bad_cast for a locale without std::ctype<char>: the text so
+            // far must be on the stream by then.
+            flush();
+            widened_newline = out->widen('\n');
+        } else {
+            widened_newline = default_newline();
+        }
+        widened_newline_known = true; // its answer is reused for every later newline
     }
     put(widened_newline);
-    flush();
-    out->flush();
+    if (formatted) {
+        flush();
+        out->flush();
+    }
     fill(blank, indent);
 }
 

@@ -18,49 +18,48 @@ enum class StreamText {
     plain,
 };
 
-/// Where the writer's text goes: a caller's stream, or straight into a string.
+/// Where the writer's text goes: a caller's stream, or the end of a string.
 ///
-/// Stream: the text is gathered and handed to the stream with one write() per buffer full.
-/// Going through the stream's public functions keeps all of its own behaviour: a stream that
-/// has gone bad receives nothing, a short write sets badbit, the exceptions the caller enabled
-/// are thrown. StreamText says how newlines and \u escapes go onto it.
+/// The text is gathered in a buffer of CAPACITY bytes inside the object and handed on with one
+/// write() or append() per buffer full, and at flush(). Nothing is allocated before the first
+/// buffer full, and no byte is written twice but by that one copy: a small document costs one
+/// allocation of exactly its size in the string, and no byte is zero-filled ahead of the text.
+///
+/// Stream: going through the stream's public functions keeps all of its own behaviour: a
+/// stream that has gone bad receives nothing, a short write sets badbit, the exceptions the
+/// caller enabled are thrown. StreamText says how newlines and \u escapes go onto it.
 ///
 /// String: for json::serialize, json::pretty_print and a json::Writer onto a string. The text
 /// is what a std::ostringstream in its default state would hold: newlines widened by the
 /// global locale, escapes as its default formatting writes them; flushing such a stream does
-/// nothing, so nothing is flushed. The text is written straight into the string's own
-/// storage, which grows geometrically (its size runs ahead of the text until flush()), so
-/// no byte is copied on the way but when the string reallocates.
+/// nothing, so nothing is flushed. The string grows by std::string::append, geometrically, and
+/// std::bad_alloc leaves it as it was.
 class OutputBuffer {
   public:
     OutputBuffer(std::ostream& out, StreamText style)
         : out(&out), text(nullptr), formatted(style == StreamText::formatted),
-          widened_newline_known(!formatted), widened_newline(formatted ? '\n' : default_newline()),
-          start(storage), cursor(storage), limit(storage + CAPACITY) {}
+          widened_newline_known(false), widened_newline('\n') {}
     explicit OutputBuffer(std::string& text)
-        : out(nullptr), text(&text), formatted(false), widened_newline_known(true),
-          widened_newline(default_newline()) {
-        point_into_text(text.size());
-    }
+        : out(nullptr), text(&text), formatted(false), widened_newline_known(false),
+          widened_newline('\n') {}
     OutputBuffer(const OutputBuffer&) = delete;
     OutputBuffer& operator=(const OutputBuffer&) = delete;
 
     void append(const char* bytes, std::size_t count) {
         if (count > room()) {
-            if (text == nullptr && count >= CAPACITY) {
-                flush();
-                deliver(bytes, count); // too big to gather: straight to the stream
+            flush();
+            if (count >= CAPACITY) {
+                deliver(bytes, count); // too big to gather: handed on as it is
                 return;
             }
-            make_room(count);
         }
         std::memcpy(cursor, bytes, count);
         cursor += count;
     }
 
     void put(char c) {
-        if (cursor == limit) {
-            make_room(1);
+        if (cursor == end()) {
+            flush();
         }
         *cursor++ = c;
     }
@@ -68,8 +67,8 @@ class OutputBuffer {
     /// `count` copies of `c`, filled straight into the buffer a piece at a time.
     void fill(char c, std::size_t count) {
         while (count != 0) {
-            if (cursor == limit) {
-                make_room(count);
+            if (cursor == end()) {
+                flush();
             }
             const std::size_t piece = std::min(count, room());
             std::memset(cursor, c, piece);
@@ -78,12 +77,12 @@ class OutputBuffer {
         }
     }
 
-    /// Room for at least `count` bytes (at most CAPACITY on a stream, any number in a
-    /// string), made first when needed; the bytes written there count once commit() is
-    /// given the end of them.
+    /// Room for at least `count` bytes (at most CAPACITY), made first when needed by handing
+    /// on what is gathered; the bytes written there count once commit() is given the end of
+    /// them.
     char* reserve(std::size_t count) {
         if (count > room()) {
-            make_room(count);
+            flush();
         }
         return cursor;
     }
@@ -93,8 +92,8 @@ class OutputBuffer {
     /// A widened newline (on a formatted stream: then a flush, with every byte before it
     /// delivered); then `indent` copies of `blank`, a space or a tab.
     void new_line(std::size_t indent, char blank) {
-        if (out != nullptr && (formatted || indent > CAPACITY / 2)) {
-            new_line_on_stream(indent, blank);
+        if (formatted || !widened_newline_known || indent > CAPACITY / 2) {
+            new_line_in_pieces(indent, blank);
             return;
         }
         // Nothing to flush: the line break and its indentation in one piece, the blanks copied
@@ -115,24 +114,21 @@ class OutputBuffer {
     /// "\u" and the UTF-16 code unit as four hexadecimal digits.
     void unicode_escape(char16_t unit);
 
-    /// Hands everything buffered on: to the stream, or (for a string) trims the string to the
-    /// text written so far.
+    /// Hands everything gathered on, to the stream or the string.
     void flush() {
-        if (text != nullptr) {
-            text->resize(static_cast<std::size_t>(cursor - start));
-            point_into_text(text->size());
-        } else if (cursor != start) {
-            deliver(start, static_cast<std::size_t>(cursor - start));
-            cursor = start;
+        if (cursor != storage) {
+            deliver(storage, static_cast<std::size_t>(cursor - storage));
+            cursor = storage;
         }
     }
 
     static constexpr std::size_t CAPACITY = std::size_t{16} * 1024;
 
   private:
-    // A newline a stream receives in its own way, or one whose indentation is too long for the
-    // stream's buffer to take in one piece.
-    void new_line_on_stream(std::size_t indent, char blank);
+    // A newline that a formatted stream receives in its own way, the first newline (which
+    // learns how newlines are widened), or one whose indentation is too long to be reserved in
+    // one piece.
+    void new_line_in_pieces(std::size_t indent, char blank);
 
     // What a std::ostringstream in its default state widens '\n' to: the global locale's
     // answer.
@@ -140,40 +136,28 @@ class OutputBuffer {
         return std::use_facet<std::ctype<char>>(std::locale()).widen('\n');
     }
 
-    std::size_t room() const { return static_cast<std::size_t>(limit - cursor); }
+    char* end() { return storage + CAPACITY; }
+    std::size_t room() const { return static_cast<std::size_t>(storage + CAPACITY - cursor); }
 
-    // Stream: delivers what is gathered. String: enlarges the string to at least twice its
-    // size and at least `count` bytes beyond the text; std::bad_alloc leaves the text intact.
-    void make_room(std::size_t count) {
-        if (text == nullptr) {
-            flush();
-            return;
-        }
-        const auto used = static_cast<std::size_t>(cursor - start);
-        text->resize(std::max({used + count, 2 * text->size(), CAPACITY}));
-        point_into_text(used);
-    }
-
-    // Points the buffer at the string's storage, the text ending `used` bytes in.
-    void point_into_text(std::size_t used) {
-        start = text->data();
-        cursor = start + used;
-        limit = start + text->size();
-    }
-
+    // Throws what the stream throws, or std::bad_alloc with the string as it was (and the
+    // bytes still gathered).
     void deliver(const char* bytes, std::size_t count) {
-        out->write(bytes, static_cast<std::streamsize>(count));
+        if (text != nullptr) {
+            text->append(bytes, count);
+        } else {
+            out->write(bytes, static_cast<std::streamsize>(count));
+        }
     }
 
     std::ostream* out;
     std::string* text;
     bool formatted; // StreamText::formatted
+    // The widened newline is asked for at the first newline, so that compact text never pays
+    // for the locale's look-up.
     bool widened_newline_known;
     char widened_newline;
-    char* start = nullptr;
-    char* cursor = nullptr;
-    char* limit = nullptr;
-    char storage[CAPACITY]; // the stream's gathering buffer (unused for a string)
+    char* cursor = storage; // the end of the text gathered in storage
+    char storage[CAPACITY];
 };
 
 } // namespace json::detail

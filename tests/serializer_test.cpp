@@ -89,6 +89,23 @@ TEST(Serializer, StringsFindEveryEscape) {
     }
 }
 
+// Text that outgrows the buffer the writer gathers it in, with a string longer than that buffer.
+TEST(Serializer, TextLongerThanItsBuffer) {
+    const std::string long_string(40000, 'x');
+    const Value document = Array{long_string, Array(3000, "0123456789")};
+    std::string expected = "[\"" + long_string + "\",[";
+    for (int i = 0; i < 3000; ++i) {
+        expected += "\"0123456789\",";
+    }
+    expected.back() = ']';
+    EXPECT_EQ(serialize(document), expected + ']');
+    std::ostringstream pretty;
+    Serializer pretty_writer;
+    pretty_writer.pretty_print(true);
+    pretty_writer.write(pretty, document);
+    EXPECT_EQ(pretty_print(document), pretty.str());
+}
+
 // Integral numbers take a shortcut in the number text; it must write what the shortest floating
 // format writes: fixed notation, or scientific where that is strictly shorter (1e+05).
 template <typename Number>

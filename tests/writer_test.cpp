@@ -89,6 +89,8 @@ TEST(Writer, EventsGiveTheTextOfSerialize) {
     expect_text_of_serialize(document);
     expect_text_of_serialize("top");
     expect_text_of_serialize(Array{});
+    // Text that outgrows the Writer's buffer, with a string longer than that buffer.
+    expect_text_of_serialize(Array{std::string(40000, 'x'), Array(3000, 0.25)});
 }
 
 #ifdef JSON_DATA_DIR
