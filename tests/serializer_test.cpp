@@ -143,6 +143,26 @@ TEST(Serializer, IntegralNumbersAsTheShortestFloatingFormat) {
     EXPECT_EQ(serialize(-12000000.0), "-1.2e+07");
 }
 
+// Fractions with up to fifteen significant digits (six for a float) take a shortcut in fixed
+// notation from 10^-3 up; the neighbouring doubles, with seventeen digits, do not.
+TEST(Serializer, FractionsAsTheShortestFloatingFormat) {
+    const std::string significand = "1.234567890123456";
+    for (std::size_t length = 1; length <= significand.size(); ++length) {
+        for (int exponent = -5; exponent <= 16; ++exponent) {
+            const std::string text = significand.substr(0, length) + 'e' + std::to_string(exponent);
+            double number = 0;
+            std::from_chars(text.data(), text.data() + text.size(), number);
+            for (const double near : {number, -number, std::nextafter(number, 0.0)}) {
+                expect_text_as_floating_format(near);
+                expect_text_as_floating_format(static_cast<float>(near));
+            }
+        }
+    }
+    for (const double number : {0.001, 0.00099, 0.3, 0.1 + 0.2, 1e14 + 0.5, 1125899906842623.5}) {
+        expect_text_as_floating_format(number);
+    }
+}
+
 // On a caller's stream the \u digits come from the stream's own formatting: the writer sets
 // only the base, the fill and the width, and gives the flags back.
 TEST(Serializer, EscapesOnAStreamFollowItsFlags) {

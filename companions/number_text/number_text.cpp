@@ -1,5 +1,7 @@
 #include "number_text.hpp"
 
+#include <algorithm>
+#include <array>
 #include <charconv>
 #include <cmath>
 #include <cstdint>
@@ -41,9 +43,85 @@ char* write_exact_integer(char* buffer, Number value) {
     return digits <= scientific_length ? end : nullptr;
 }
 
+// Powers of ten from 10^0 to 10^17, each exact in a double, and up to 10^10 in a float.
+constexpr std::array<double, 18> POWERS_OF_TEN = {1e0,  1e1,  1e2,  1e3,  1e4,  1e5,
+                                                  1e6,  1e7,  1e8,  1e9,  1e10, 1e11,
+                                                  1e12, 1e13, 1e14, 1e15, 1e16, 1e17};
+
+// `digits` with a decimal point `fraction_length` digits from its end (after "0." and zeros
+// when it has no more digits than that), after a minus sign when `negative`; returns the end.
+char* write_fixed(char* buffer, bool negative, std::uint64_t digits, std::size_t fraction_length) {
+    char text[std::numeric_limits<std::uint64_t>::digits10 + 1];
+    const auto length = static_cast<std::size_t>(
+        std::to_chars(std::begin(text), std::end(text), digits).ptr - text);
+    char* out = buffer;
+    if (negative) {
+        *out++ = '-';
+    }
+    if (length > fraction_length) {
+        out = std::copy_n(text, length - fraction_length, out);
+    } else {
+        *out++ = '0';
+    }
+    *out++ = '.';
+    const std::size_t leading_zeros = fraction_length - std::min(length, fraction_length);
+    out = std::fill_n(out, leading_zeros, '0');
+    return std::copy(text + length - (fraction_length - leading_zeros), text + length, out);
+}
+
+// Writes a value with a fractional part, of magnitude from 10^-3 up, whose shortest
+// round-trip text has few enough digits (up to 15 significant ones for a double, 6 for a
+// float), as that text in fixed notation, and returns its end; nullptr for any other value.
+// Those are the numbers people and most programs write, and this is the text the floating
+// to_chars gives them, found with a multiplication per fractional digit and one division
+// instead of its general digit search. For k = 1, 2, ... while the value scaled by 10^k stays
+// below 2^(digits - 3):
+// - The values that read back as `value` span less than a quarter at that scale, so at most
+//   one integer (a k-digit decimal) lies among them, within one and a half units in the last
+//   place of the rounded product: if the product is further from its nearest integer, there
+//   is none.
+// - Dividing that integer by 10^k, both exact, rounds the quotient as reading its decimal text
+//   would: equality proves that the decimal reads back as `value`.
+// The first k that has one gives the only decimal of fewest fractional digits that reads back,
+// and every other one has more significant digits: the shortest text. From 10^-3 up, fixed
+// notation of a fraction is never longer than scientific, which to_chars takes only when it is
+// strictly shorter.
+template <typename Number>
+char* write_short_fraction(char* buffer, Number value) {
+    constexpr auto limit =
+        static_cast<Number>(std::uint64_t{1} << (std::numeric_limits<Number>::digits - 3));
+    // One and a half units in the last place are at most 1.5 epsilon of the product; the test
+    // allows 4, as a wider one costs only a division where no decimal reads back.
+    constexpr Number tolerance = 4 * std::numeric_limits<Number>::epsilon();
+    const Number magnitude = std::fabs(value);
+    if (!(magnitude >= static_cast<Number>(1e-3))) {
+        return nullptr;
+    }
+    // 10^17 times 10^-3 is past the limit of a double, 10^10 times it past that of a float:
+    // every power used is exact in the number's type.
+    for (std::size_t scale = 1; scale != POWERS_OF_TEN.size(); ++scale) {
+        const auto power = static_cast<Number>(POWERS_OF_TEN.at(scale));
+        const Number scaled = magnitude * power;
+        if (!(scaled < limit)) {
+            break;
+        }
+        // Adding one half is exact below the limit; the conversion truncates.
+        const auto digits = static_cast<std::uint64_t>(scaled + static_cast<Number>(0.5));
+        const auto nearest = static_cast<Number>(digits);
+        if (std::fabs(scaled - nearest) <= scaled * tolerance && nearest / power == magnitude) {
+            // A last digit 0 at k = 1 is an integral value, which is not a fraction.
+            return digits % 10 == 0 ? nullptr : write_fixed(buffer, value < 0, digits, scale);
+        }
+    }
+    return nullptr;
+}
+
 template <typename Number>
 char* write_finite(char* buffer, Number value) {
     if (char* const end = write_exact_integer(buffer, value)) {
+        return end;
+    }
+    if (char* const end = write_short_fraction(buffer, value)) {
         return end;
     }
     // The shortest round-trip form needs at most 24 characters for a double, so this cannot run
