@@ -57,7 +57,7 @@ class Validator {
     bool boolean(bool) { return true; }
     // The literal is NUL-terminated (the grammar's copy).
     bool number(std::string_view literal) {
-        return !options.exact_numbers || held_exactly(literal, string_to_double(literal.data())) ||
+        return !options.exact_numbers || held_exactly(literal, literal_to_double(literal)) ||
                refusal.inexact(literal);
     }
     bool string(std::string_view) { return true; }
@@ -124,7 +124,8 @@ bool StreamPieces::append(std::string& text, std::size_t count) {
 
 ParseReport validate(std::string_view text, const ParseOptions& options) {
     detail::Validator validator(options);
-    detail::Grammar<detail::Validator> grammar(validator, options);
+    detail::Workspace workspace;
+    detail::Grammar<detail::Validator> grammar(validator, options, workspace);
     const ParseResult result = grammar.feed(text.data(), text.data() + text.size(), true);
     if (result == ParseResult::SUCCESS) {
         return ParseReport();
@@ -136,7 +137,8 @@ ParseReport validate(std::string_view text, const ParseOptions& options) {
 
 ParseReport validate(std::istream& in, const ParseOptions& options) {
     detail::Validator validator(options);
-    detail::Grammar<detail::Validator> grammar(validator, options);
+    detail::Workspace workspace;
+    detail::Grammar<detail::Validator> grammar(validator, options, workspace);
     detail::TextPosition position;
     std::string rest;
     ParseReport report = detail::feed_stream(in, grammar, position, rest);

@@ -70,8 +70,9 @@ std::string u16_to_u8(char16_t* text, int count) {
 } // namespace detail
 
 ParseReport parse(std::istream& in, Value& out, const ParseOptions& options) {
-    detail::DocumentBuilder builder(options);
-    detail::Grammar<detail::DocumentBuilder> grammar(builder, options);
+    detail::Workspace workspace;
+    detail::DocumentBuilder builder(options, workspace);
+    detail::Grammar<detail::DocumentBuilder> grammar(builder, options, workspace);
     detail::TextPosition position;
     std::string rest;
     ParseReport report = detail::feed_stream(in, grammar, position, rest);

@@ -4,12 +4,14 @@
 
 #include <cmath>
 #include <cstdio>
+#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <map>
 #include <random>
 #include <sstream>
+#include <vector>
 
 namespace {
 
@@ -379,6 +381,37 @@ TEST(ParseOptions, ExactNumbersAgreeWithTheWriter) {
     }
     EXPECT_GT(refused, 1000); // both outcomes were tried
     EXPECT_LT(refused, 19000);
+}
+
+// Numbers become the double nearest to them, whether converted directly (at most fifteen
+// digits and no exponent) or by the number-text library: literals of 1 to 18 digits with the
+// point anywhere, and the edges of the direct path, against strtod.
+TEST(Parser, NumbersBecomeTheNearestDouble) {
+    std::vector<std::string> literals = {"-0",
+                                         "-0.0",
+                                         "999999999999999",
+                                         "0.999999999999999",
+                                         "9999999999999999",
+                                         "0.000000000000001",
+                                         "0.0000000000000001",
+                                         "1.5e3",
+                                         "-2.5E-3"};
+    std::mt19937_64 random(2026);
+    for (std::size_t round = 0; round < 20000; ++round) {
+        const std::string digits = std::to_string(random() | 1ULL << 63).substr(0, 1 + round % 18);
+        const std::size_t point = random() % (digits.size() + 1);
+        literals.push_back((round % 2 == 0 ? "-" : "") +
+                           (point == 0 ? "0" : digits.substr(0, point)) +
+                           (point < digits.size() ? "." + digits.substr(point) : ""));
+    }
+    for (const std::string& literal : literals) {
+        Value number;
+        ASSERT_EQ(parse(literal, number), R::SUCCESS) << literal;
+        const double expected = std::strtod(literal.c_str(), nullptr);
+        EXPECT_TRUE(number.as_number() == expected &&
+                    std::signbit(number.as_number()) == std::signbit(expected))
+            << literal;
+    }
 }
 
 #ifdef JSON_DATA_DIR

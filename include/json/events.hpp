@@ -114,7 +114,8 @@ ParseReport feed_stream(std::istream& in, Grammar& grammar, TextPosition& positi
 template <typename Handler>
 ParseReport parse_events(std::string_view text, Handler& handler,
                          const ParseOptions& options = {}) {
-    detail::Grammar<Handler> grammar(handler, options);
+    detail::Workspace workspace;
+    detail::Grammar<Handler> grammar(handler, options, workspace);
     const ParseResult result = grammar.feed(text.data(), text.data() + text.size(), true);
     return result == ParseResult::SUCCESS
                ? ParseReport()
@@ -127,7 +128,8 @@ ParseReport parse_events(std::string_view text, Handler& handler,
 /// failure, reported as json::parse(std::istream&) reports it; the stream ends as it does.
 template <typename Handler>
 ParseReport parse_events(std::istream& in, Handler& handler, const ParseOptions& options = {}) {
-    detail::Grammar<Handler> grammar(handler, options);
+    detail::Workspace workspace;
+    detail::Grammar<Handler> grammar(handler, options, workspace);
     detail::TextPosition position;
     std::string rest;
     return detail::feed_stream(in, grammar, position, rest);

@@ -5,6 +5,7 @@
 // json/parse.hpp after the declarations it uses.
 
 #include <json/detail/grammar.hpp>
+#include <json/detail/workspace.hpp>
 #include <json/value.hpp>
 
 #include <algorithm>
@@ -13,6 +14,8 @@
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
+#include <memory_resource>
+#include <optional>
 #include <string>
 #include <string_view>
 #include <unordered_set>
@@ -20,6 +23,47 @@
 #include <vector>
 
 namespace json::detail {
+
+/// The double nearest to a JSON number `literal` (NUL-terminated). A literal without an
+/// exponent whose digits, the point left out, number at most fifteen is converted here: those
+/// digits are an integer below 2^53 and the power of ten that scales it at most 10^15, both
+/// exact doubles, so the one division rounds once, to the nearest double, as the number-text
+/// library would. Most numbers in documents (counts, ids, coordinates, prices) take this path;
+/// the others go to the library.
+inline double literal_to_double(std::string_view literal) {
+    constexpr std::ptrdiff_t most_digits = 15;
+    static constexpr double powers_of_ten[most_digits + 1] = {
+        1e0, 1e1, 1e2, 1e3, 1e4, 1e5, 1e6, 1e7, 1e8, 1e9, 1e10, 1e11, 1e12, 1e13, 1e14, 1e15};
+    const auto is_digit = [](char c) { return c >= '0' && c <= '9'; };
+    const char* next = literal.data();
+    const char* const end = next + literal.size();
+    const bool negative = *next == '-';
+    next += negative ? 1 : 0;
+    // Digits beyond the nineteenth overflow, harmlessly: such a literal is not converted here.
+    std::uint64_t digits = 0;
+    const auto read_digits = [&] {
+        const char* const first = next;
+        for (; next != end && is_digit(*next); ++next) {
+            digits = 10 * digits + static_cast<std::uint64_t>(*next - '0');
+        }
+        return next - first;
+    };
+    std::ptrdiff_t count = read_digits();
+    std::ptrdiff_t decimals = 0;
+    if (next != end && *next == '.') {
+        ++next;
+        decimals = read_digits();
+        count += decimals;
+    }
+    if (next != end || count > most_digits) {
+        return string_to_double(literal.data()); // an exponent, or too many digits
+    }
+    double magnitude = static_cast<double>(digits);
+    if (decimals != 0) {
+        magnitude /= powers_of_ten[decimals];
+    }
+    return negative ? -magnitude : magnitude;
+}
 
 /// Whether the writer writes `value`, read from the JSON number `literal`, back as the same
 /// decimal number. Up to fifteen significant digits (the literal has at least as many
@@ -102,29 +146,36 @@ class MemberNames {
 /// (exact_numbers), an object that names a member twice (reject_duplicate_keys).
 class DocumentBuilder {
   public:
-    explicit DocumentBuilder(const ParseOptions& options) : options(options) {}
+    /// The builder's stacks are kept in `workspace`, each with room for a small document from
+    /// the start.
+    DocumentBuilder(const ParseOptions& options, Workspace& workspace)
+        : options(options), pending(workspace.resource()), strings(workspace.resource()),
+          finished_arrays(workspace.resource()), finished_objects(workspace.resource()),
+          names(workspace.resource()), open_containers(workspace.resource()),
+          members_in_key_order(workspace.resource()) {
+        pending.reserve(INITIAL_VALUES);
+        strings.reserve(INITIAL_VALUES);
+        names.reserve(INITIAL_VALUES);
+        members_in_key_order.reserve(INITIAL_VALUES);
+        open_containers.reserve(INITIAL_CONTAINERS);
+        finished_arrays.reserve(INITIAL_CONTAINERS);
+        finished_objects.reserve(INITIAL_CONTAINERS);
+    }
 
     // The handler's events; false when the document is refused (see refusal()).
-    bool null() {
-        push_value(Null());
-        return true;
-    }
-    bool boolean(bool truth) {
-        push_value(truth);
-        return true;
-    }
+    bool null() { return push({Kind::NULL_VALUE}); }
+    bool boolean(bool truth) { return push({Kind::BOOLEAN, truth}); }
     // The literal is NUL-terminated (the grammar's copy), so it is read in place.
     bool number(std::string_view literal) {
-        const double value = string_to_double(literal.data());
+        const double value = literal_to_double(literal);
         if (options.exact_numbers && !held_exactly(literal, value)) {
             return refusal.inexact(literal);
         }
-        push_value(value);
-        return true;
+        return push({Kind::NUMBER, false, value});
     }
     bool string(std::string_view text) {
-        push_value(std::string(text));
-        return true;
+        strings.emplace_back(text);
+        return push({Kind::STRING, false, 0.0, strings.size() - 1});
     }
     bool key(std::string_view name) {
         if (options.reject_duplicate_keys && !repeated.add(name)) {
@@ -149,57 +200,74 @@ class DocumentBuilder {
     }
 
     /// Hands the finished document to `out`, without a copy.
-    void take(Value& out) { out.swap(values.back()); }
+    void take(Value& out) {
+        std::optional<Value> document;
+        adopt(pending.back(),
+              [&document](const auto& initial) -> Value& { return document.emplace(initial); });
+        out.swap(*document);
+    }
 
     /// Puts a refusal of the document in `report`, see DocumentRefusal.
     void explain(ParseReport& report) { refusal.explain(report); }
 
   private:
+    // A finished value whose container is still open. A string or a container waits in a stack
+    // of its own at `slot` until its parent closes, and is then swapped into the Value that
+    // holds it for good: that Value is the only one ever made for it, and the values waiting
+    // here are plain data, copied and dropped without a call.
+    enum class Kind : unsigned char { NULL_VALUE, BOOLEAN, NUMBER, STRING, ARRAY, OBJECT };
+    struct Pending {
+        Kind kind = Kind::NULL_VALUE;
+        bool truth = false;   // a BOOLEAN's
+        double number = 0.0;  // a NUMBER's
+        std::size_t slot = 0; // a STRING's index in `strings`, a container's in its stack
+    };
+
     struct OpenContainer {
         bool is_object;
-        std::size_t first_value;  // index into `values` of its first child
+        std::size_t first_value;  // index into `pending` of its first child
         std::size_t first_name;   // index into `names` of its first member name
+        std::size_t first_string; // index into `strings` of its first string child
         std::size_t first_array;  // index into `finished_arrays` of its first Array child
         std::size_t first_object; // index into `finished_objects` of its first Object child
     };
-
-    // A finished container other than the document itself waits in `finished_arrays` or
-    // `finished_objects` until its parent closes, and stands in `values` as a marker: the
-    // builder never makes Undefined or a float, so Undefined stands for an Array and a float
-    // for an Object. Kept apart like this, the container's content is swapped into the Value
-    // that holds it for good, and that Value is the only one ever allocated for it.
-    static constexpr int ARRAY_MARKER = UNDEFINED_INDEX;
-    static constexpr int OBJECT_MARKER = FLOAT_INDEX;
 
     // A member of an object being closed, in the order the map wants its keys.
     struct MemberInKeyOrder {
         std::uint64_t name_prefix; // see name_prefix()
         std::size_t child;         // position among the object's children
-        std::size_t slot;          // for a marker, index of its finished container
     };
 
+    bool push(const Pending& value) {
+        pending.push_back(value);
+        return true;
+    }
     bool open(bool is_object) {
-        open_containers.push_back({is_object, values.size(), names.size(), finished_arrays.size(),
-                                   finished_objects.size()});
+        open_containers.push_back({is_object, pending.size(), names.size(), strings.size(),
+                                   finished_arrays.size(), finished_objects.size()});
         return true;
     }
     bool close();
-    template <typename Container, typename Marker>
-    void finish(Container& content, std::vector<Container>& finished, Marker marker);
-    template <typename Alternative>
-    Value& push_value(Alternative&& value);
-    void grow_values();
+    void close_object(const OpenContainer& container);
+    void close_array(const OpenContainer& container);
+    void release_children(const OpenContainer& container);
+    template <typename Place>
+    void adopt(const Pending& child, Place place);
 
     const ParseOptions options;
     DocumentRefusal refusal;
     MemberNames repeated;
 
-    std::vector<Value> values; // finished values whose container is still open
-    std::vector<Array> finished_arrays;
-    std::vector<Object> finished_objects;
-    std::vector<std::string> names; // member names of the open objects, in document order
-    std::vector<OpenContainer> open_containers;
-    std::vector<MemberInKeyOrder> members_in_key_order; // reused by every object closed
+    std::pmr::vector<Pending> pending; // finished values whose container is still open
+    std::pmr::vector<std::string> strings;
+    std::pmr::vector<Array> finished_arrays;
+    std::pmr::vector<Object> finished_objects;
+    std::pmr::vector<std::string> names; // member names of the open objects, in document order
+    std::pmr::vector<OpenContainer> open_containers;
+    std::pmr::vector<MemberInKeyOrder> members_in_key_order; // reused by every object closed
+    // The first capacities, which fill about four fifths of a Workspace (see there).
+    static constexpr std::size_t INITIAL_VALUES = 24;
+    static constexpr std::size_t INITIAL_CONTAINERS = 8;
 };
 
 // The first eight bytes of a name as a big-endian number, zero-padded: where two names' prefixes
@@ -220,147 +288,112 @@ inline std::uint64_t name_prefix(const std::string& name) {
     return kept == 0 ? 0 : word & ~std::uint64_t{0} << (8 * (sizeof word - kept));
 }
 
-// Builds the innermost open container at its final size from the values given for it,
-// adopting each one without a copy, and leaves it as one finished value. False when the object
-// names a member twice and that is refused.
+// Calls `place` with an empty container or string of the child's kind, or with its scalar, to
+// construct the Value in its final place, then swaps the content in: a subtree changes owner
+// without being copied. Scalars are constructed from their alternative, inline: no call to the
+// general copy constructor, which has containers to deal with.
+template <typename Place>
+void DocumentBuilder::adopt(const Pending& child, Place place) {
+    switch (child.kind) {
+    case Kind::ARRAY:
+        boost::get<Array>(place(Array())).swap(finished_arrays[child.slot]);
+        break;
+    case Kind::OBJECT:
+        boost::get<Object>(place(Object())).swap(finished_objects[child.slot]);
+        break;
+    case Kind::STRING:
+        boost::get<std::string>(place(std::string())).swap(strings[child.slot]);
+        break;
+    case Kind::NUMBER:
+        place(child.number);
+        break;
+    case Kind::BOOLEAN:
+        place(child.truth);
+        break;
+    case Kind::NULL_VALUE:
+        place(Null());
+        break;
+    }
+}
+
+// Builds the innermost open container at its final size from the values given for it, and
+// leaves it as one finished value.
 inline bool DocumentBuilder::close() {
     const OpenContainer container = open_containers.back();
     open_containers.pop_back();
-    // The finished containers of the children, in document order.
-    std::size_t next_array = container.first_array;
-    std::size_t next_object = container.first_object;
-    const auto slot_of = [&](const Value& child) -> std::size_t {
-        switch (child.which()) {
-        case ARRAY_MARKER:
-            return next_array++;
-        case OBJECT_MARKER:
-            return next_object++;
-        default:
-            return 0;
-        }
-    };
-    // Calls `place` with an empty container or string of the child's kind (or a copy of a
-    // scalar child) to construct the Value in its final place, then swaps the content in: a
-    // subtree changes owner without being copied.
-    const auto adopt = [&](Value& child, std::size_t slot, auto place) {
-        switch (child.which()) {
-        case ARRAY_MARKER:
-            boost::get<Array>(place(Array())).swap(finished_arrays[slot]);
-            break;
-        case OBJECT_MARKER:
-            boost::get<Object>(place(Object())).swap(finished_objects[slot]);
-            break;
-        case STRING_INDEX:
-            boost::get<std::string>(place(std::string())).swap(boost::get<std::string>(child));
-            break;
-        case DOUBLE_INDEX:
-            // Scalars are constructed from their alternative, inline: no call to the general
-            // copy constructor, which has containers to deal with.
-            place(boost::get<double>(child));
-            break;
-        case BOOL_INDEX:
-            place(boost::get<bool>(child));
-            break;
-        default:
-            place(Null()); // the parser makes no other alternative
-        }
-    };
-    const auto children = values.begin() + static_cast<std::ptrdiff_t>(container.first_value);
-    const auto release_children = [&] {
-        values.erase(children, values.end());
-        finished_arrays.erase(finished_arrays.begin() +
-                                  static_cast<std::ptrdiff_t>(container.first_array),
-                              finished_arrays.end());
-        finished_objects.erase(finished_objects.begin() +
-                                   static_cast<std::ptrdiff_t>(container.first_object),
-                               finished_objects.end());
-    };
     if (container.is_object) {
-        // The members go into the map in key order, each placed at its end after a single key
-        // comparison; the order is found with comparisons of eight-byte prefixes, most of which
-        // settle it without comparing the names themselves.
-        const auto names_of = names.begin() + static_cast<std::ptrdiff_t>(container.first_name);
-        members_in_key_order.clear();
-        for (auto child = children; child != values.end(); ++child) {
-            const auto position = static_cast<std::size_t>(child - children);
-            members_in_key_order.push_back(
-                {name_prefix(names_of[static_cast<std::ptrdiff_t>(position)]), position,
-                 slot_of(*child)});
-        }
-        const auto name_of = [&](const MemberInKeyOrder& member) -> const std::string& {
-            return names_of[static_cast<std::ptrdiff_t>(member.child)];
-        };
-        // Equal names keep document order: the later member then replaces the earlier one.
-        const auto key_order = [&](const MemberInKeyOrder& left, const MemberInKeyOrder& right) {
-            if (left.name_prefix != right.name_prefix) {
-                return left.name_prefix < right.name_prefix;
-            }
-            const int order = name_of(left).compare(name_of(right));
-            return order != 0 ? order < 0 : left.child < right.child;
-        };
-        // Documents written by programs often list names in order already: a check that stops
-        // at the first name out of order costs less than sorting what is sorted.
-        if (!std::is_sorted(members_in_key_order.begin(), members_in_key_order.end(), key_order)) {
-            std::sort(members_in_key_order.begin(), members_in_key_order.end(), key_order);
-        }
-        Object members;
-        for (const MemberInKeyOrder& member : members_in_key_order) {
-            std::string& name = names_of[static_cast<std::ptrdiff_t>(member.child)];
-            adopt(children[static_cast<std::ptrdiff_t>(member.child)], member.slot,
-                  [&](const auto& initial) -> Value& {
-                      const std::size_t count = members.size();
-                      const auto placed =
-                          members.emplace_hint(members.end(), std::move(name), initial);
-                      if (members.size() == count) {
-                          placed->second = initial; // a repeated name: the later member wins
-                      }
-                      return placed->second;
-                  });
-        }
-        names.resize(container.first_name);
-        release_children();
-        finish(members, finished_objects, 0.0F); // OBJECT_MARKER
-        return true;
+        close_object(container);
+    } else {
+        close_array(container);
     }
-    Array items;
-    items.reserve(values.size() - container.first_value);
-    for (auto child = children; child != values.end(); ++child) {
-        adopt(*child, slot_of(*child),
-              [&items](const auto& initial) -> Value& { return items.emplace_back(initial); });
-    }
-    release_children();
-    finish(items, finished_arrays, Undefined()); // ARRAY_MARKER
     return true;
 }
 
-template <typename Container, typename Marker>
-void DocumentBuilder::finish(Container& content, std::vector<Container>& finished, Marker marker) {
-    if (open_containers.empty()) {
-        boost::get<Container>(push_value(Container())).swap(content);
-    } else {
-        finished.push_back(std::move(content));
-        push_value(marker);
+inline void DocumentBuilder::close_array(const OpenContainer& container) {
+    Array items;
+    items.reserve(pending.size() - container.first_value);
+    for (auto child = pending.begin() + static_cast<std::ptrdiff_t>(container.first_value);
+         child != pending.end(); ++child) {
+        adopt(*child,
+              [&items](const auto& initial) -> Value& { return items.emplace_back(initial); });
     }
+    release_children(container);
+    finished_arrays.push_back(std::move(items));
+    push({Kind::ARRAY, false, 0.0, finished_arrays.size() - 1});
 }
 
-template <typename Alternative>
-Value& DocumentBuilder::push_value(Alternative&& value) {
-    if (values.size() == values.capacity()) {
-        grow_values();
+// The members go into the map in key order, each placed at its end after a single key
+// comparison; the order is found with comparisons of eight-byte prefixes, most of which settle
+// it without comparing the names themselves.
+inline void DocumentBuilder::close_object(const OpenContainer& container) {
+    const auto children = pending.begin() + static_cast<std::ptrdiff_t>(container.first_value);
+    const auto names_of = names.begin() + static_cast<std::ptrdiff_t>(container.first_name);
+    members_in_key_order.clear();
+    for (std::size_t child = 0; child != pending.size() - container.first_value; ++child) {
+        members_in_key_order.push_back(
+            {name_prefix(names_of[static_cast<std::ptrdiff_t>(child)]), child});
     }
-    return values.emplace_back(std::forward<Alternative>(value));
+    const auto name_of = [&](const MemberInKeyOrder& member) -> const std::string& {
+        return names_of[static_cast<std::ptrdiff_t>(member.child)];
+    };
+    // Equal names keep document order: the later member then replaces the earlier one.
+    const auto key_order = [&](const MemberInKeyOrder& left, const MemberInKeyOrder& right) {
+        if (left.name_prefix != right.name_prefix) {
+            return left.name_prefix < right.name_prefix;
+        }
+        const int order = name_of(left).compare(name_of(right));
+        return order != 0 ? order < 0 : left.child < right.child;
+    };
+    // Documents written by programs often list names in order already: a check that stops at
+    // the first name out of order costs less than sorting what is sorted.
+    if (!std::is_sorted(members_in_key_order.begin(), members_in_key_order.end(), key_order)) {
+        std::sort(members_in_key_order.begin(), members_in_key_order.end(), key_order);
+    }
+    Object members;
+    for (const MemberInKeyOrder& member : members_in_key_order) {
+        std::string& name = names_of[static_cast<std::ptrdiff_t>(member.child)];
+        adopt(children[static_cast<std::ptrdiff_t>(member.child)],
+              [&](const auto& initial) -> Value& {
+                  const std::size_t count = members.size();
+                  const auto placed = members.emplace_hint(members.end(), std::move(name), initial);
+                  if (members.size() == count) {
+                      placed->second = initial; // a repeated name: the later member wins
+                  }
+                  return placed->second;
+              });
+    }
+    names.resize(container.first_name);
+    release_children(container);
+    finished_objects.push_back(std::move(members));
+    push({Kind::OBJECT, false, 0.0, finished_objects.size() - 1});
 }
 
-// std::vector would copy the values when it grows (a Value has no move constructor), so they
-// are swapped into the larger storage instead: no string is copied. Only scalars, strings
-// and markers live here, so none of the swaps can fail.
-inline void DocumentBuilder::grow_values() {
-    std::vector<Value> larger;
-    larger.reserve(std::max<std::size_t>(64, 2 * values.capacity()));
-    for (Value& value : values) {
-        larger.emplace_back().swap(value);
-    }
-    values.swap(larger);
+// Drops what the children of a closed container left behind in the stacks.
+inline void DocumentBuilder::release_children(const OpenContainer& container) {
+    pending.resize(container.first_value);
+    strings.resize(container.first_string);
+    finished_arrays.resize(container.first_array);
+    finished_objects.resize(container.first_object);
 }
 
 } // namespace json::detail

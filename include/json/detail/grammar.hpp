@@ -7,11 +7,13 @@
 
 #include <json/detail/byte_scan.hpp>
 #include <json/detail/utf8.hpp>
+#include <json/detail/workspace.hpp>
 
 #include <algorithm>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
+#include <memory_resource>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -32,7 +34,11 @@ namespace json::detail {
 template <typename Handler>
 class Grammar {
   public:
-    Grammar(Handler& handler, const ParseOptions& options) : handler(handler), options(options) {}
+    /// The stack of open containers is kept in `workspace`.
+    Grammar(Handler& handler, const ParseOptions& options, Workspace& workspace)
+        : handler(handler), options(options), open_containers(workspace.resource()) {
+        open_containers.reserve(INITIAL_DEPTH);
+    }
 
     /// Not a result: the text given so far ends before the document does, or inside a token.
     static constexpr ParseResult NEED_MORE = static_cast<ParseResult>(-1);
@@ -164,7 +170,8 @@ class Grammar {
     Expect expect = Expect::VALUE;
     // 1 for an object, 0 for an array, innermost last (bytes: a std::vector<bool> costs a bit
     // operation on every access).
-    std::vector<unsigned char> open_containers;
+    std::pmr::vector<unsigned char> open_containers;
+    static constexpr std::size_t INITIAL_DEPTH = 64;
     std::string failure_note;
     Refusal refused = Refusal::NONE;
     std::string decoded;         // reused for a string with escapes
