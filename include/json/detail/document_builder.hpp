@@ -34,12 +34,15 @@ inline double literal_to_double(std::string_view literal) {
     constexpr std::ptrdiff_t most_digits = 15;
     static constexpr double powers_of_ten[most_digits + 1] = {
         1e0, 1e1, 1e2, 1e3, 1e4, 1e5, 1e6, 1e7, 1e8, 1e9, 1e10, 1e11, 1e12, 1e13, 1e14, 1e15};
+    // A sign, fifteen digits and a point at most: longer literals are not read twice.
+    if (literal.size() > most_digits + 2) {
+        return string_to_double(literal.data());
+    }
     const auto is_digit = [](char c) { return c >= '0' && c <= '9'; };
     const char* next = literal.data();
     const char* const end = next + literal.size();
     const bool negative = *next == '-';
     next += negative ? 1 : 0;
-    // Digits beyond the nineteenth overflow, harmlessly: such a literal is not converted here.
     std::uint64_t digits = 0;
     const auto read_digits = [&] {
         const char* const first = next;
