@@ -166,19 +166,27 @@ class DocumentBuilder {
     }
 
     // The handler's events; false when the document is refused (see refusal()).
-    bool null() { return push({Kind::NULL_VALUE}); }
-    bool boolean(bool truth) { return push({Kind::BOOLEAN, truth}); }
+    bool null() {
+        push(Kind::NULL_VALUE);
+        return true;
+    }
+    bool boolean(bool truth) {
+        push(Kind::BOOLEAN).truth = truth;
+        return true;
+    }
     // The literal is NUL-terminated (the grammar's copy), so it is read in place.
     bool number(std::string_view literal) {
         const double value = literal_to_double(literal);
         if (options.exact_numbers && !held_exactly(literal, value)) {
             return refusal.inexact(literal);
         }
-        return push({Kind::NUMBER, false, value});
+        push(Kind::NUMBER).number = value;
+        return true;
     }
     bool string(std::string_view text) {
         strings.emplace_back(text);
-        return push({Kind::STRING, false, 0.0, strings.size() - 1});
+        push(Kind::STRING).slot = strings.size() - 1;
+        return true;
     }
     bool key(std::string_view name) {
         if (options.reject_duplicate_keys && !repeated.add(name)) {
@@ -241,9 +249,13 @@ class DocumentBuilder {
         std::size_t child;         // position among the object's children
     };
 
-    bool push(const Pending& value) {
-        pending.push_back(value);
-        return true;
+    // The fields are stored where the value stays: a Pending made on the stack and copied would
+    // be loaded whole just after its fields were stored, a load the processor cannot forward
+    // from those stores (a stall on every value).
+    Pending& push(Kind kind) {
+        Pending& value = pending.emplace_back();
+        value.kind = kind;
+        return value;
     }
     bool open(bool is_object) {
         open_containers.push_back({is_object, pending.size(), names.size(), strings.size(),
@@ -342,7 +354,7 @@ inline void DocumentBuilder::close_array(const OpenContainer& container) {
     }
     release_children(container);
     finished_arrays.push_back(std::move(items));
-    push({Kind::ARRAY, false, 0.0, finished_arrays.size() - 1});
+    push(Kind::ARRAY).slot = finished_arrays.size() - 1;
 }
 
 // The members go into the map in key order, each placed at its end after a single key
@@ -388,7 +400,7 @@ inline void DocumentBuilder::close_object(const OpenContainer& container) {
     names.resize(container.first_name);
     release_children(container);
     finished_objects.push_back(std::move(members));
-    push({Kind::OBJECT, false, 0.0, finished_objects.size() - 1});
+    push(Kind::OBJECT).slot = finished_objects.size() - 1;
 }
 
 // Drops what the children of a closed container left behind in the stacks.
