@@ -1,7 +1,9 @@
 #include <json/value.hpp>
 
 #include <algorithm>
+#include <cstddef>
 #include <cstdlib>
+#include <tuple>
 #include <utility>
 #include <vector>
 
@@ -44,86 +46,166 @@ bool is_empty_container(const Value& value) {
                                         : boost::get<Object>(value).empty();
 }
 
+// A non-empty Array or Object.
+bool has_nested_content(const Value& value) {
+    return is_container(value) && !is_empty_container(value);
+}
+
 Value& child_value(Value& item) {
     return item;
 }
 Value& child_value(Object::value_type& member) {
     return member.second;
 }
+const Value& child_value(const Value& item) {
+    return item;
+}
+const Value& child_value(const Object::value_type& member) {
+    return member.second;
+}
 
-// The variant of a shallow copy of `source`: its scalar or string, or an empty container of its
-// kind. Returned as a prvalue, it initialises a Value's base in place (guaranteed copy
-// elision), so an empty container costs exactly one allocation and nothing is built ahead of
-// use.
-detail::ValueVariant shallow_copy_of(const Value& source) {
+// Calls `make` with what a copy of `source` is built from: its scalar or string, or an empty
+// container of its kind; returns what `make` returns. Each case names its alternative, so a
+// copy of a number or a bool is two stores, without the visitation of a variant copy.
+template <typename Make>
+decltype(auto) with_shallow_content(const Value& source, Make&& make) {
     switch (source.which()) {
+    case detail::UNDEFINED_INDEX:
+        return make(Undefined());
+    case detail::NULL_INDEX:
+        return make(Null());
+    case detail::BOOL_INDEX:
+        return make(boost::get<bool>(source));
+    case detail::DOUBLE_INDEX:
+        return make(boost::get<double>(source));
+    case detail::STRING_INDEX:
+        return make(boost::get<std::string>(source));
     case ARRAY_INDEX:
-        return detail::ValueVariant(Array());
+        return make(Array());
     case OBJECT_INDEX:
-        return detail::ValueVariant(Object());
+        return make(Object());
+    case detail::FLOAT_INDEX:
+        return make(boost::get<float>(source));
     default:
-        return static_cast<const detail::ValueVariant&>(source);
+        std::abort();
     }
 }
 
-struct CopyJob {
-    const Value* source;
-    Value* target;
-};
-using CopyJobs = std::vector<CopyJob>;
+// The variant of a shallow copy of `source`. Returned as a prvalue, it initialises a Value's
+// base in place (guaranteed copy elision), so an empty container costs exactly one allocation.
+detail::ValueVariant shallow_copy_of(const Value& source) {
+    return with_shallow_content(source, [](auto&& content) {
+        return detail::ValueVariant(std::forward<decltype(content)>(content));
+    });
+}
 
-// The containers a deep copy running on this thread has yet to fill, or null. While it is
-// set, the Value copy constructor copies shallowly and lists a container child here instead
-// of descending into it; that lets the copy constructors of std::vector and std::map clone a
-// whole container at once (exact size, tree structure taken over without comparing a key or
-// rebalancing) while the depth of the call stack stays bounded.
-// A constant-initialised pointer: nothing is constructed on first use or destroyed at exit.
-// The initial-exec model makes each access a single load. It costs eight bytes of static
-// TLS, which glibc's reserve for libraries loaded later provides (dlopen checked).
-thread_local CopyJobs* pending_copies __attribute__((tls_model("initial-exec"))) = nullptr;
+// The most children a container may have to count as shallow.
+constexpr std::size_t SHALLOW_SIZE = 8;
 
-// Sets the list of pending containers for the lifetime of one deep copy.
-class CopyInProgress {
+template <typename Container>
+bool holds_no_nested_content(const Container& container) {
+    return container.size() <= SHALLOW_SIZE &&
+           std::none_of(container.begin(), container.end(),
+                        [](const auto& item) { return has_nested_content(child_value(item)); });
+}
+
+// Whether `value` is a scalar, a string, an empty container, or a container of at most
+// SHALLOW_SIZE children that are none of them non-empty containers. Checking costs at most
+// SHALLOW_SIZE steps.
+bool is_shallow(const Value& value) {
+    switch (value.which()) {
+    case ARRAY_INDEX:
+        return holds_no_nested_content(boost::get<Array>(value));
+    case OBJECT_INDEX:
+        return holds_no_nested_content(boost::get<Object>(value));
+    default:
+        return true;
+    }
+}
+
+// One deep copy: fills an empty container with copies of a source container's children, and
+// theirs. It recurses into nested containers, in document order, up to MAX_RECURSION levels,
+// and lists deeper ones on its own work list, filled when the recursion has returned; so documents
+// of any depth copy with a bounded call stack, and a document of ordinary depth never touches
+// the list. Every container is allocated once at its final size.
+class TreeCopier {
   public:
-    explicit CopyInProgress(CopyJobs& pending) { pending_copies = &pending; }
-    ~CopyInProgress() { pending_copies = nullptr; }
-    CopyInProgress(const CopyInProgress&) = delete;
-    CopyInProgress& operator=(const CopyInProgress&) = delete;
-};
-
-// Fills the empty container of `target` with a copy of `source`'s container whose own
-// container children are still empty (and listed as pending).
-void copy_level(const Value& source, Value& target) {
-    if (source.which() == ARRAY_INDEX) {
-        Array level(boost::get<Array>(source));
-        boost::get<Array>(target).swap(level); // elements (and pointers to them) stay put
-    } else {
-        Object level(boost::get<Object>(source));
-        boost::get<Object>(target).swap(level); // so do map nodes
+    // `target` holds an empty container of the kind `source` holds. On std::bad_alloc, what was
+    // built so far stays in `target`, whose owner releases it.
+    void copy(const Value& source, Value& target) {
+        fill(source, target, 0);
+        while (!deferred.empty()) {
+            const CopyJob job = deferred.back();
+            deferred.pop_back();
+            fill(*job.source, *job.target, 0);
+        }
     }
-}
 
-// Fills the empty container of `target` with a deep copy of the container of `source`, one
-// container at a time from an explicit work list, so deep documents never deepen the call
-// stack. On std::bad_alloc the owner of `target` destroys it, which releases everything built
-// so far.
-void copy_contents(const Value& source, Value& target) {
-    CopyJobs pending; // allocates only once a nested container turns up
-    const CopyInProgress in_progress(pending);
-    CopyJob job{&source, &target};
-    for (;;) {
-        const std::size_t listed = pending.size();
-        copy_level(*job.source, *job.target);
-        // The children just listed are taken first to last: the copy then reads and writes
-        // memory in document order (depth first), which the caches reward.
-        std::reverse(pending.begin() + static_cast<std::ptrdiff_t>(listed), pending.end());
-        if (pending.empty()) {
+  private:
+    // Deep enough for any document written by hand, shallow enough for any thread's stack.
+    static constexpr int MAX_RECURSION = 64;
+
+    struct CopyJob {
+        const Value* source;
+        Value* target;
+    };
+
+    void fill(const Value& source, Value& target, int depth) {
+        if (source.which() == ARRAY_INDEX) {
+            copy_items(boost::get<Array>(source), boost::get<Array>(target), depth);
+        } else {
+            copy_members(boost::get<Object>(source), boost::get<Object>(target), depth);
+        }
+    }
+
+    // Reserving first makes one allocation of the exact size, and keeps each element where it
+    // is built: a listed job may point to it.
+    void copy_items(const Array& from, Array& to, int depth) {
+        to.reserve(from.size());
+        for (const Value& item : from) {
+            with_shallow_content(item, [&to](auto&& content) {
+                to.emplace_back(std::forward<decltype(content)>(content));
+            });
+            descend(item, to.back(), depth);
+        }
+    }
+
+    // An object whose members are all shallow is cloned whole by the copy constructor of
+    // std::map, which takes over the tree's shape without comparing a key. The copy
+    // constructor of Value that it calls for each member copies a shallow container without
+    // going further down, so this recursion is two levels deep at most. Any other object gets
+    // its members one at a time; they come in ascending key order, so each goes after the last.
+    void copy_members(const Object& from, Object& to, int depth) {
+        if (std::all_of(from.begin(), from.end(),
+                        [](const auto& member) { return is_shallow(member.second); })) {
+            Object copy(from);
+            to.swap(copy);
             return;
         }
-        job = pending.back();
-        pending.pop_back();
+        for (const auto& [key, value] : from) {
+            const auto member = with_shallow_content(value, [&to, &key](auto&& content) {
+                return to.emplace_hint(
+                    to.end(), std::piecewise_construct, std::forward_as_tuple(key),
+                    std::forward_as_tuple(std::forward<decltype(content)>(content)));
+            });
+            descend(value, member->second, depth);
+        }
     }
-}
+
+    // Fills the child `target` now or later if `source` is a non-empty container.
+    void descend(const Value& source, Value& target, int depth) {
+        if (!has_nested_content(source)) {
+            return;
+        }
+        if (depth < MAX_RECURSION) {
+            fill(source, target, depth + 1);
+        } else {
+            deferred.push_back({&source, &target});
+        }
+    }
+
+    std::vector<CopyJob> deferred; // allocates only for documents deeper than MAX_RECURSION
+};
 
 // Releases a tree level by level: the contents of nested containers are swapped onto work
 // lists (no copy, no recursion) and destroyed from there once their own children have been
@@ -208,15 +290,8 @@ Value::Value(detail::ShallowCopy, const Value& other)
     : detail::ValueVariant(shallow_copy_of(other)) {}
 
 Value::Value(const Value& other) : Value(detail::ShallowCopy{}, other) {
-    if (!is_container(other)) {
-        return;
-    }
-    if (pending_copies != nullptr) {
-        // Part of a deep copy further up: filled from its work list, not from here. Empty
-        // containers are listed too, so that their content is not looked at twice.
-        pending_copies->push_back({&other, this});
-    } else if (!is_empty_container(other)) {
-        copy_contents(other, *this);
+    if (has_nested_content(other)) {
+        TreeCopier().copy(other, *this);
     }
 }
 

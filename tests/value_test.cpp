@@ -13,8 +13,11 @@ using P = Property;
 
 // Distinct Values of every alternative; the containers hold every alternative at some depth.
 std::vector<Value> samples() {
-    const Value list = Array{1, "two", nullptr, Array{}, Object{}, 2.5f, Undefined()};
-    const Value nested = Array{list, Object{{"in", list}}}, ab = Object{{"a", list}, {"b", 1}};
+    const Value list = Array{1, "two", nullptr, true, Array{}, Object{}, 2.5f, Undefined()};
+    const Value nested = Array{list, Object{{"in", list}}};
+    const Value ab =
+        Object{{"a", list},    {"b", 1},        {"c", "two"}, {"d", nullptr},    {"e", true},
+               {"f", Array{}}, {"g", Object{}}, {"h", 2.5f},  {"i", Undefined()}};
     const Value a1 = Object{{"a", 1}}, a2 = Object{{"a", 2}}, b1 = Object{{"b", 1}};
     const Value pair = Array{1, 2}, reversed = Array{2, 1}, triple = Array{1, 2, 3};
     return {Value(),  nullptr, true, 1.0, 1.0f, "a string long enough to live on the heap",
@@ -61,6 +64,19 @@ TEST(Value, CopiesAssignmentAndEquality) {
     boost::get<Array>(boost::get<Array>(copy)[0])[1] = "changed";
     EXPECT_NE(copy, all[6]);
     EXPECT_EQ(all[6], samples()[6]);
+}
+
+// Arrays and objects that each hold a container beside the next level, deeper than the copy
+// recurses: the levels beyond are copied from its work list, several at each level.
+TEST(Value, CopiesNestingBeyondTheRecursion) {
+    const std::vector<Value> all = samples();
+    Value deep = all[6];
+    for (int level = 0; level < 300; ++level) {
+        deep = level % 2 == 0 ? Value(Array{all[7], deep})
+                              : Value(Object{{"a", deep}, {"b", all[11]}});
+    }
+    const Value copy = deep;
+    EXPECT_EQ(copy, deep);
 }
 
 TEST(Builders, Expressions) {

@@ -58,7 +58,7 @@ enum Alternative : int {
 };
 
 /// Selects the constructor that copies a Value but leaves an Array or Object empty; the deep
-/// copy uses it to build a tree level by level instead of recursing.
+/// copy starts from it and fills the containers itself.
 struct ShallowCopy {};
 
 /// The member name a reference token of a well-formed JSON Pointer stands for: "~1" is '/',
@@ -103,8 +103,9 @@ JSONVALUE_API const char* const traits<int>::name;
 /// owns its whole tree; every copy is deep. There are copy operations only: a temporary Value
 /// is copied like any other.
 ///
-/// No operation of a Value recurses once per level of nesting: copying, assignment,
-/// destruction and comparison work on documents of any depth with a bounded call stack.
+/// No operation of a Value recurses once per level of nesting beyond a fixed depth: copying,
+/// assignment, destruction and comparison work on documents of any depth with a bounded call
+/// stack.
 class JSONVALUE_API Value : public detail::ValueVariant {
   public:
     /// The shared constant holding Undefined.
@@ -163,11 +164,15 @@ class JSONVALUE_API Value : public detail::ValueVariant {
     template <typename T, std::enable_if_t<!std::is_same_v<std::remove_cv_t<T>, char>, int> = 0>
     Value(T*) = delete;
 
-    /// Deep copy, linear in the size of the tree: each container is copied whole by the copy
-    /// constructor of its std::vector or std::map (a map's tree structure is cloned, no key
-    /// is compared), depth first, with the containers still to fill on a work list kept in
-    /// a thread-local pointer while the copy runs, so the call stack stays flat. Strong
-    /// guarantee: on std::bad_alloc no Value comes into being and nothing leaks.
+    /// Deep copy, linear in the size of the tree. Each Array is allocated once at its exact
+    /// size, its elements built in place; an Object whose members are scalars, strings or
+    /// containers of at most eight of those is cloned whole by the copy constructor of
+    /// std::map (its tree structure taken over, no key compared), any other gets its members
+    /// appended in key order. Nested containers are copied by recursion, in document order, up
+    /// to 64 levels deep and, beyond that, from a work list that belongs to this copy, so the
+    /// call stack stays bounded whatever the depth. No global or thread-local state is
+    /// involved: copies of one Value run on any number of threads at once.
+    /// Strong guarantee: on std::bad_alloc no Value comes into being and nothing leaks.
     Value(const Value& other);
 
     /// Internal: copies `other`, but an Array or Object comes out empty.
