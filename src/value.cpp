@@ -183,13 +183,13 @@ class TreeCopier {
             to.swap(copy);
             return;
         }
-        for (const auto& [key, value] : from) {
-            const auto member = with_shallow_content(value, [&to, &key](auto&& content) {
+        for (const auto& source : from) {
+            const auto member = with_shallow_content(source.second, [&to, &source](auto&& content) {
                 return to.emplace_hint(
-                    to.end(), std::piecewise_construct, std::forward_as_tuple(key),
+                    to.end(), std::piecewise_construct, std::forward_as_tuple(source.first),
                     std::forward_as_tuple(std::forward<decltype(content)>(content)));
             });
-            descend(value, member->second, depth);
+            descend(source.second, member->second, depth);
         }
     }
 
