@@ -20,20 +20,21 @@ enum class StreamText {
 
 /// Where the writer's text goes: a caller's stream, or the end of a string.
 ///
-/// The text is gathered in a buffer of CAPACITY bytes inside the object and handed on with one
-/// write() or append() per buffer full, and at flush(). Nothing is allocated before the first
-/// buffer full, and no byte is written twice but by that one copy: a small document costs one
-/// allocation of exactly its size in the string, and no byte is zero-filled ahead of the text.
-///
-/// Stream: going through the stream's public functions keeps all of its own behaviour: a
-/// stream that has gone bad receives nothing, a short write sets badbit, the exceptions the
-/// caller enabled are thrown. StreamText says how newlines and \u escapes go onto it.
+/// Stream: the text is gathered in a buffer of CAPACITY bytes inside the object and handed to
+/// the stream with one write() per buffer full. Going through the stream's public functions
+/// keeps all of its own behaviour: a stream that has gone bad receives nothing, a short write
+/// sets badbit, the exceptions the caller enabled are thrown. StreamText says how newlines and
+/// \u escapes go onto it.
 ///
 /// String: for json::serialize, json::pretty_print and a json::Writer onto a string. The text
 /// is what a std::ostringstream in its default state would hold: newlines widened by the
 /// global locale, escapes as its default formatting writes them; flushing such a stream does
-/// nothing, so nothing is flushed. The string grows by std::string::append, geometrically, and
-/// std::bad_alloc leaves it as it was.
+/// nothing, so nothing is flushed. The text is gathered in the same buffer first, and a text
+/// that fits it is appended whole at flush(): a small document costs one allocation of its own
+/// size, and no byte is zero-filled. A text that outgrows the buffer is moved into the
+/// string's own storage and written straight there from then on; the string grows
+/// geometrically (its size running ahead of the text until flush()), which costs less for a
+/// long text than copying each buffer full. std::bad_alloc leaves the text intact.
 class OutputBuffer {
   public:
     OutputBuffer(std::ostream& out, StreamText style)
@@ -47,19 +48,20 @@ class OutputBuffer {
 
     void append(const char* bytes, std::size_t count) {
         if (count > room()) {
-            flush();
-            if (count >= CAPACITY) {
-                deliver(bytes, count); // too big to gather: handed on as it is
+            if (text == nullptr && count >= CAPACITY) {
+                flush();
+                deliver(bytes, count); // too big to gather: straight to the stream
                 return;
             }
+            make_room(count);
         }
         std::memcpy(cursor, bytes, count);
         cursor += count;
     }
 
     void put(char c) {
-        if (cursor == end()) {
-            flush();
+        if (cursor == limit) {
+            make_room(1);
         }
         *cursor++ = c;
     }
@@ -67,8 +69,8 @@ class OutputBuffer {
     /// `count` copies of `c`, filled straight into the buffer a piece at a time.
     void fill(char c, std::size_t count) {
         while (count != 0) {
-            if (cursor == end()) {
-                flush();
+            if (cursor == limit) {
+                make_room(count);
             }
             const std::size_t piece = std::min(count, room());
             std::memset(cursor, c, piece);
@@ -77,12 +79,12 @@ class OutputBuffer {
         }
     }
 
-    /// Room for at least `count` bytes (at most CAPACITY), made first when needed by handing
-    /// on what is gathered; the bytes written there count once commit() is given the end of
-    /// them.
+    /// Room for at least `count` bytes (at most CAPACITY on a stream, any number in a
+    /// string), made first when needed; the bytes written there count once commit() is
+    /// given the end of them.
     char* reserve(std::size_t count) {
         if (count > room()) {
-            flush();
+            make_room(count);
         }
         return cursor;
     }
@@ -114,11 +116,15 @@ class OutputBuffer {
     /// "\u" and the UTF-16 code unit as four hexadecimal digits.
     void unicode_escape(char16_t unit);
 
-    /// Hands everything gathered on, to the stream or the string.
+    /// Hands everything written on: to the stream, or (for a string) appends the text
+    /// gathered, or trims the string to the text written into it.
     void flush() {
-        if (cursor != storage) {
-            deliver(storage, static_cast<std::size_t>(cursor - storage));
-            cursor = storage;
+        if (start != storage) {
+            text->resize(static_cast<std::size_t>(cursor - start));
+            point_into_text(text->size());
+        } else if (cursor != start) {
+            deliver(start, static_cast<std::size_t>(cursor - start));
+            cursor = start;
         }
     }
 
@@ -126,8 +132,8 @@ class OutputBuffer {
 
   private:
     // A newline that a formatted stream receives in its own way, the first newline (which
-    // learns how newlines are widened), or one whose indentation is too long to be reserved in
-    // one piece.
+    // learns how newlines are widened), or one whose indentation is too long for the buffer to
+    // take in one piece.
     void new_line_in_pieces(std::size_t indent, char blank);
 
     // What a std::ostringstream in its default state widens '\n' to: the global locale's
@@ -136,11 +142,37 @@ class OutputBuffer {
         return std::use_facet<std::ctype<char>>(std::locale()).widen('\n');
     }
 
-    char* end() { return storage + CAPACITY; }
-    std::size_t room() const { return static_cast<std::size_t>(storage + CAPACITY - cursor); }
+    std::size_t room() const { return static_cast<std::size_t>(limit - cursor); }
 
-    // Throws what the stream throws, or std::bad_alloc with the string as it was (and the
-    // bytes still gathered).
+    // Stream: delivers what is gathered. String: enlarges the string geometrically, to at
+    // least `count` bytes beyond the text, moves what is gathered there, and writes into the
+    // string from then on; std::bad_alloc leaves the text intact.
+    void make_room(std::size_t count) {
+        if (text == nullptr) {
+            flush();
+            return;
+        }
+        const bool gathering = start == storage;
+        const auto written = static_cast<std::size_t>(cursor - start);
+        // While gathering, the string holds only what came before this writer's text;
+        // afterwards [start, cursor) is the string's whole text.
+        const std::size_t used = gathering ? text->size() + written : written;
+        // Twice the string's size (twice the buffer at first): sizes of 2^k times the buffer
+        // for a text that starts empty.
+        text->resize(std::max({used + count, 2 * text->size(), 2 * CAPACITY}));
+        if (gathering) {
+            std::memcpy(text->data() + used - written, storage, written);
+        }
+        point_into_text(used);
+    }
+
+    // Points the buffer at the string's storage, the text ending `used` bytes in.
+    void point_into_text(std::size_t used) {
+        start = text->data();
+        cursor = start + used;
+        limit = start + text->size();
+    }
+
     void deliver(const char* bytes, std::size_t count) {
         if (text != nullptr) {
             text->append(bytes, count);
@@ -156,7 +188,11 @@ class OutputBuffer {
     // for the locale's look-up.
     bool widened_newline_known;
     char widened_newline;
-    char* cursor = storage; // the end of the text gathered in storage
+    // The text being written: [start, cursor), with room up to limit. In storage (the stream's
+    // buffer, and a string's until its text outgrows it), or in the string's own storage.
+    char* start = storage;
+    char* cursor = storage;
+    char* limit = storage + CAPACITY;
     char storage[CAPACITY];
 };
 

@@ -39,9 +39,9 @@ std::ostream& write(std::ostream& out, const Value& value, const WriteOptions& o
 }
 
 // The text a formatted stream would hold if it were a std::ostringstream in its default state,
-// gathered and appended to the string instead: nobody else sees that stream, so the stream's
-// bookkeeping (a flush per newline in pretty mode, a copy of the text at the end) buys
-// nothing. A small document is one allocation of its own size.
+// written into the string instead: nobody else sees that stream, so the stream's bookkeeping
+// (a flush per newline in pretty mode, a copy of the text at the end) buys nothing. A small
+// document is gathered and appended whole: one allocation of its own size.
 std::string serialize(const Value& value, const WriteOptions& options) {
     std::string text;
     detail::OutputBuffer buffer(text);

@@ -1,7 +1,5 @@
 #include "write_visitor.hpp"
 
-#include <array>
-#include <memory_resource>
 #include <type_traits>
 #include <vector>
 
@@ -31,10 +29,10 @@ class ScalarWriter : public boost::static_visitor<void> {
 // containers.
 class ContainerWriter {
   public:
-    explicit ContainerWriter(TextLayout& layout)
-        : layout(layout), shallow_frames(shallow_storage.data(), shallow_storage.size(),
-                                         std::pmr::new_delete_resource()),
-          open_containers(&shallow_frames) {
+    // Room for SHALLOW_DEPTH levels from the start: a shallow document, as most are, makes one
+    // allocation for its open containers instead of one per doubling. (Storage for them on the
+    // call stack through a std::pmr resource was measured slower, for large documents too.)
+    explicit ContainerWriter(TextLayout& layout) : layout(layout) {
         open_containers.reserve(SHALLOW_DEPTH);
     }
 
@@ -129,17 +127,10 @@ class ContainerWriter {
         open_containers.emplace_back(level, container);
     }
 
-    // The stack of open containers lives in storage on the call stack while the document is at
-    // most SHALLOW_DEPTH containers deep, as small documents are: no allocation for them. A
-    // deeper one moves it to the heap (through operator new, as std::allocator would, not a
-    // default resource a program may have set), where it grows geometrically; the blocks it
-    // outgrew, together about the size of the last one, are released with the writer.
     static constexpr std::size_t SHALLOW_DEPTH = 16;
 
     TextLayout& layout;
-    alignas(Frame) std::array<std::byte, SHALLOW_DEPTH * sizeof(Frame)> shallow_storage;
-    std::pmr::monotonic_buffer_resource shallow_frames;
-    std::pmr::vector<Frame> open_containers;
+    std::vector<Frame> open_containers;
 };
 
 } // namespace

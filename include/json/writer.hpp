@@ -34,9 +34,10 @@ namespace json {
 /// event parser as it is. Each returns true.
 class JSONVALUE_API Writer {
   public:
-    /// Appends the text to `text`. The Writer gathers the text in a buffer of its own and
-    /// appends it a buffer full at a time, so the string may lag behind the text while a value
-    /// is being written: it holds exactly what it held before plus the text written once the
+    /// Appends the text to `text`. The Writer gathers the text in a buffer of its own and,
+    /// once it outgrows that, writes into the string's own storage, whose size may run ahead
+    /// of the text: while a value is being written the string may lag behind the text or run
+    /// ahead of it, and it holds exactly what it held before plus the text written once the
     /// top-level value is complete, after flush(), and once the Writer is destroyed. Until
     /// then the string must not be changed but through the Writer. Throws std::bad_alloc.
     explicit Writer(std::string& text, const WriteOptions& options = {});
