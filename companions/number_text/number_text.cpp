@@ -8,6 +8,7 @@
 #include <cstring>
 #include <limits>
 #include <string_view>
+#include <type_traits>
 
 namespace {
 
@@ -69,51 +70,98 @@ char* write_fixed(char* buffer, bool negative, std::uint64_t digits, std::size_t
     return std::copy(text + length - (fraction_length - leading_zeros), text + length, out);
 }
 
+// The binary exponent e of a positive normal value: 2^e <= magnitude < 2^(e + 1).
+template <typename Number>
+int binary_exponent(Number magnitude) {
+    using Bits =
+        std::conditional_t<sizeof(Number) == sizeof(std::uint64_t), std::uint64_t, std::uint32_t>;
+    static_assert(sizeof(Bits) == sizeof(Number));
+    Bits bits = 0;
+    std::memcpy(&bits, &magnitude, sizeof bits);
+    constexpr int significand_bits = std::numeric_limits<Number>::digits - 1;
+    constexpr int bias = std::numeric_limits<Number>::max_exponent - 1;
+    return static_cast<int>(bits >> significand_bits) - bias;
+}
+
+// The lowest binary exponent of a value from 10^-3 up: 2^-10 < 10^-3.
+constexpr int LOWEST_FRACTION_EXPONENT = -10;
+
+// For each binary exponent e from LOWEST_FRACTION_EXPONENT on, while 2^(e + 1) is below
+// 2^(digits - 3): the largest k with 2^(e + 1) * 10^k <= 2^(digits - 3), so that every value
+// with that exponent scaled by 10^k stays below 2^(digits - 3).
+template <typename Number>
+constexpr auto FRACTION_SCALES = [] {
+    constexpr int room_bits = std::numeric_limits<Number>::digits - 3;
+    std::array<std::size_t, room_bits - LOWEST_FRACTION_EXPONENT> scales{};
+    for (std::size_t i = 0; i != scales.size(); ++i) {
+        // 2^(digits - 3) / 2^(e + 1), e = LOWEST_FRACTION_EXPONENT + i.
+        const int room_exponent = room_bits - 1 - LOWEST_FRACTION_EXPONENT - static_cast<int>(i);
+        const auto room = static_cast<double>(std::uint64_t{1} << room_exponent);
+        std::size_t scale = 0;
+        while (scale + 1 != POWERS_OF_TEN.size() && POWERS_OF_TEN.at(scale + 1) <= room) {
+            ++scale;
+        }
+        scales.at(i) = scale;
+    }
+    return scales;
+}();
+
 // Writes a value with a fractional part, of magnitude from 10^-3 up, whose shortest
-// round-trip text has few enough digits (up to 15 significant ones for a double, 6 for a
+// round-trip text has few enough digits (14 or 15 significant ones for a double, 5 or 6 for a
 // float), as that text in fixed notation, and returns its end; nullptr for any other value.
 // Those are the numbers people and most programs write, and this is the text the floating
-// to_chars gives them, found with a multiplication per fractional digit and one division
-// instead of its general digit search. For k = 1, 2, ... while the value scaled by 10^k stays
-// below 2^(digits - 3):
+// to_chars gives them, found with one multiplication and one division instead of its general
+// digit search. The value is scaled by the largest power of ten 10^k that keeps every value of
+// its binary exponent below 2^(digits - 3):
 // - The values that read back as `value` span less than a quarter at that scale, so at most
 //   one integer (a k-digit decimal) lies among them, within one and a half units in the last
-//   place of the rounded product: if the product is further from its nearest integer, there
-//   is none.
+//   place of the rounded product: if there is one, it is the product's nearest integer.
 // - Dividing that integer by 10^k, both exact, rounds the quotient as reading its decimal text
-//   would: equality proves that the decimal reads back as `value`.
-// The first k that has one gives the only decimal of fewest fractional digits that reads back,
-// and every other one has more significant digits: the shortest text. From 10^-3 up, fixed
-// notation of a fraction is never longer than scientific, which to_chars takes only when it is
-// strictly shorter.
+//   would: equality proves that the decimal reads back as `value`, and inequality that none
+//   with k or fewer fractional digits does.
+// - Without its trailing zeros it is then the only decimal of its length that reads back, and
+//   every other one has more significant digits: the shortest text. From 10^-3 up, fixed
+//   notation of a fraction is never longer than scientific, which to_chars takes only when it
+//   is strictly shorter.
 template <typename Number>
 char* write_short_fraction(char* buffer, Number value) {
-    constexpr auto limit =
-        static_cast<Number>(std::uint64_t{1} << (std::numeric_limits<Number>::digits - 3));
-    // One and a half units in the last place are at most 1.5 epsilon of the product; the test
-    // allows 4, as a wider one costs only a division where no decimal reads back.
-    constexpr Number tolerance = 4 * std::numeric_limits<Number>::epsilon();
     const Number magnitude = std::fabs(value);
     if (!(magnitude >= static_cast<Number>(1e-3))) {
         return nullptr;
     }
-    // 10^17 times 10^-3 is past the limit of a double, 10^10 times it past that of a float:
-    // every power used is exact in the number's type.
-    for (std::size_t scale = 1; scale != POWERS_OF_TEN.size(); ++scale) {
-        const auto power = static_cast<Number>(POWERS_OF_TEN.at(scale));
-        const Number scaled = magnitude * power;
-        if (!(scaled < limit)) {
-            break;
-        }
-        // Adding one half is exact below the limit; the conversion truncates.
-        const auto digits = static_cast<std::uint64_t>(scaled + static_cast<Number>(0.5));
-        const auto nearest = static_cast<Number>(digits);
-        if (std::fabs(scaled - nearest) <= scaled * tolerance && nearest / power == magnitude) {
-            // A last digit 0 at k = 1 is an integral value, which is not a fraction.
-            return digits % 10 == 0 ? nullptr : write_fixed(buffer, value < 0, digits, scale);
-        }
+    const auto& scales = FRACTION_SCALES<Number>;
+    const auto row =
+        static_cast<std::size_t>(binary_exponent(magnitude) - LOWEST_FRACTION_EXPONENT);
+    if (row >= scales.size() || scales.at(row) == 0) {
+        return nullptr; // no room for a fractional digit
     }
-    return nullptr;
+    const std::size_t scale = scales.at(row);
+    const auto power = static_cast<Number>(POWERS_OF_TEN.at(scale));
+    const Number scaled = magnitude * power;
+    // Adding one half is exact below 2^(digits - 3); the conversion truncates.
+    auto digits = static_cast<std::uint64_t>(scaled + static_cast<Number>(0.5));
+    const auto nearest = static_cast<Number>(digits);
+    if (nearest / power != magnitude) {
+        return nullptr;
+    }
+    // The trailing zeros off, eight, four, two and one at a time (at most seventeen of them),
+    // each divisor a constant that the compiler turns into a multiplication.
+    std::size_t fraction_length = scale;
+    const auto strip_zeros = [&](std::size_t count, std::uint64_t divisor) {
+        const bool strip = fraction_length >= count && digits % divisor == 0;
+        if (strip) {
+            digits /= divisor;
+            fraction_length -= count;
+        }
+        return strip;
+    };
+    while (strip_zeros(8, 100'000'000)) {
+    }
+    strip_zeros(4, 10'000);
+    strip_zeros(2, 100);
+    strip_zeros(1, 10);
+    return fraction_length == 0 ? nullptr // integral: not a fraction
+                                : write_fixed(buffer, value < 0, digits, fraction_length);
 }
 
 template <typename Number>
