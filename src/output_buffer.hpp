@@ -119,7 +119,7 @@ class OutputBuffer {
     /// Hands everything written on: to the stream, or (for a string) appends the text
     /// gathered, or trims the string to the text written into it.
     void flush() {
-        if (start != storage) {
+        if (text != nullptr && start != storage) {
             text->resize(static_cast<std::size_t>(cursor - start));
             point_into_text(text->size());
         } else if (cursor != start) {
