@@ -137,9 +137,15 @@ class OutputBuffer {
     void new_line_in_pieces(std::size_t indent, char blank);
 
     // What a std::ostringstream in its default state widens '\n' to: the global locale's
-    // answer.
+    // answer. The classic locale, which a program has unless it sets another, answers '\n';
+    // telling it by comparison (the same locale compares equal at once) skips the facet's
+    // look-up, a dynamic_cast.
     static char default_newline() {
-        return std::use_facet<std::ctype<char>>(std::locale()).widen('\n');
+        const std::locale global;
+        if (global == std::locale::classic()) {
+            return '\n';
+        }
+        return std::use_facet<std::ctype<char>>(global).widen('\n');
     }
 
     std::size_t room() const { return static_cast<std::size_t>(limit - cursor); }
