@@ -41,6 +41,7 @@ TEST(Parser, Values) {
         {R"([1, "two", [true], {"k": null}])",
          Array{1, "two", Array{true}, Object{{"k", nullptr}}}},
         {R"({"a": 1, "b": [2], "a": {"c": 3}})", Object{{"a", Object{{"c", 3}}}, {"b", Array{2}}}},
+        {R"({"s": "first", "t": "kept", "s": "last"})", Object{{"s", "last"}, {"t", "kept"}}},
         // Members are taken in key order: names sharing eight-byte prefixes, empty, holding NUL
         // or bytes from 0x80 up, and repeated names far apart (the last one wins).
         {R"({"abcdefgh2": 1, "abcdefgh1": 2, "": 3, "abcdefgh": [4], "\u0000": 5, "\u00e9": 6,

@@ -14,7 +14,6 @@
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
-#include <memory_resource>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -152,10 +151,9 @@ class DocumentBuilder {
     /// The builder's stacks are kept in `workspace`, each with room for a small document from
     /// the start.
     DocumentBuilder(const ParseOptions& options, Workspace& workspace)
-        : options(options), pending(workspace.resource()), strings(workspace.resource()),
-          finished_arrays(workspace.resource()), finished_objects(workspace.resource()),
-          names(workspace.resource()), open_containers(workspace.resource()),
-          members_in_key_order(workspace.resource()) {
+        : options(options), pending(workspace), strings(workspace), finished_arrays(workspace),
+          finished_objects(workspace), names(workspace), open_containers(workspace),
+          members_in_key_order(workspace) {
         pending.reserve(INITIAL_VALUES);
         strings.reserve(INITIAL_VALUES);
         names.reserve(INITIAL_VALUES);
@@ -213,8 +211,9 @@ class DocumentBuilder {
     /// Hands the finished document to `out`, without a copy.
     void take(Value& out) {
         std::optional<Value> document;
-        adopt(pending.back(),
-              [&document](const auto& initial) -> Value& { return document.emplace(initial); });
+        adopt(pending.back(), [&document](auto&& initial) -> Value& {
+            return document.emplace(std::forward<decltype(initial)>(initial));
+        });
         out.swap(*document);
     }
 
@@ -273,13 +272,13 @@ class DocumentBuilder {
     DocumentRefusal refusal;
     MemberNames repeated;
 
-    std::pmr::vector<Pending> pending; // finished values whose container is still open
-    std::pmr::vector<std::string> strings;
-    std::pmr::vector<Array> finished_arrays;
-    std::pmr::vector<Object> finished_objects;
-    std::pmr::vector<std::string> names; // member names of the open objects, in document order
-    std::pmr::vector<OpenContainer> open_containers;
-    std::pmr::vector<MemberInKeyOrder> members_in_key_order; // reused by every object closed
+    WorkspaceVector<Pending> pending; // finished values whose container is still open
+    WorkspaceVector<std::string> strings;
+    WorkspaceVector<Array> finished_arrays;
+    WorkspaceVector<Object> finished_objects;
+    WorkspaceVector<std::string> names; // member names of the open objects, in document order
+    WorkspaceVector<OpenContainer> open_containers;
+    WorkspaceVector<MemberInKeyOrder> members_in_key_order; // reused by every object closed
     // The first capacities, which fill about four fifths of a Workspace (see there).
     static constexpr std::size_t INITIAL_VALUES = 24;
     static constexpr std::size_t INITIAL_CONTAINERS = 8;
@@ -303,10 +302,11 @@ inline std::uint64_t name_prefix(const std::string& name) {
     return kept == 0 ? 0 : word & ~std::uint64_t{0} << (8 * (sizeof word - kept));
 }
 
-// Calls `place` with an empty container or string of the child's kind, or with its scalar, to
-// construct the Value in its final place, then swaps the content in: a subtree changes owner
-// without being copied. Scalars are constructed from their alternative, inline: no call to the
-// general copy constructor, which has containers to deal with.
+// Calls `place` with the child's string (to be moved from) or scalar, or with an empty container
+// of its kind, to construct the Value in its final place; a container's content is then swapped
+// in: a subtree changes owner without being copied. Each Value is constructed from its
+// alternative, inline: no call to the general copy constructor, which has containers to deal
+// with.
 template <typename Place>
 void DocumentBuilder::adopt(const Pending& child, Place place) {
     switch (child.kind) {
@@ -317,7 +317,7 @@ void DocumentBuilder::adopt(const Pending& child, Place place) {
         boost::get<Object>(place(Object())).swap(finished_objects[child.slot]);
         break;
     case Kind::STRING:
-        boost::get<std::string>(place(std::string())).swap(strings[child.slot]);
+        place(std::move(strings[child.slot]));
         break;
     case Kind::NUMBER:
         place(child.number);
@@ -349,8 +349,9 @@ inline void DocumentBuilder::close_array(const OpenContainer& container) {
     items.reserve(pending.size() - container.first_value);
     for (auto child = pending.begin() + static_cast<std::ptrdiff_t>(container.first_value);
          child != pending.end(); ++child) {
-        adopt(*child,
-              [&items](const auto& initial) -> Value& { return items.emplace_back(initial); });
+        adopt(*child, [&items](auto&& initial) -> Value& {
+            return items.emplace_back(std::forward<decltype(initial)>(initial));
+        });
     }
     release_children(container);
     finished_arrays.push_back(std::move(items));
@@ -371,7 +372,7 @@ inline void DocumentBuilder::close_object(const OpenContainer& container) {
     const auto name_of = [&](const MemberInKeyOrder& member) -> const std::string& {
         return names_of[static_cast<std::ptrdiff_t>(member.child)];
     };
-    // Equal names keep document order: the later member then replaces the earlier one.
+    // Equal names keep document order, so that the last of them can be told apart.
     const auto key_order = [&](const MemberInKeyOrder& left, const MemberInKeyOrder& right) {
         if (left.name_prefix != right.name_prefix) {
             return left.name_prefix < right.name_prefix;
@@ -385,17 +386,21 @@ inline void DocumentBuilder::close_object(const OpenContainer& container) {
         std::sort(members_in_key_order.begin(), members_in_key_order.end(), key_order);
     }
     Object members;
-    for (const MemberInKeyOrder& member : members_in_key_order) {
-        std::string& name = names_of[static_cast<std::ptrdiff_t>(member.child)];
-        adopt(children[static_cast<std::ptrdiff_t>(member.child)],
-              [&](const auto& initial) -> Value& {
-                  const std::size_t count = members.size();
-                  const auto placed = members.emplace_hint(members.end(), std::move(name), initial);
-                  if (members.size() == count) {
-                      placed->second = initial; // a repeated name: the later member wins
-                  }
-                  return placed->second;
-              });
+    for (auto member = members_in_key_order.begin(); member != members_in_key_order.end();
+         ++member) {
+        // Equal names stand next to each other, in document order: the last of them wins.
+        const auto next = member + 1;
+        if (next != members_in_key_order.end() && next->name_prefix == member->name_prefix &&
+            name_of(*next) == name_of(*member)) {
+            continue;
+        }
+        std::string& name = names_of[static_cast<std::ptrdiff_t>(member->child)];
+        adopt(children[static_cast<std::ptrdiff_t>(member->child)], [&](auto&& initial) -> Value& {
+            return members
+                .emplace_hint(members.end(), std::move(name),
+                              std::forward<decltype(initial)>(initial))
+                ->second;
+        });
     }
     names.resize(container.first_name);
     release_children(container);

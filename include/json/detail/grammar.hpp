@@ -13,7 +13,6 @@
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
-#include <memory_resource>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -36,7 +35,7 @@ class Grammar {
   public:
     /// The stack of open containers is kept in `workspace`.
     Grammar(Handler& handler, const ParseOptions& options, Workspace& workspace)
-        : handler(handler), options(options), open_containers(workspace.resource()) {
+        : handler(handler), options(options), open_containers(workspace) {
         open_containers.reserve(INITIAL_DEPTH);
     }
 
@@ -170,7 +169,7 @@ class Grammar {
     Expect expect = Expect::VALUE;
     // 1 for an object, 0 for an array, innermost last (bytes: a std::vector<bool> costs a bit
     // operation on every access).
-    std::pmr::vector<unsigned char> open_containers;
+    WorkspaceVector<unsigned char> open_containers;
     static constexpr std::size_t INITIAL_DEPTH = 64;
     std::string failure_note;
     Refusal refused = Refusal::NONE;

@@ -7,18 +7,19 @@
 #include <cstddef>
 #include <functional>
 #include <memory>
-#include <memory_resource>
+#include <new>
+#include <vector>
 
 namespace json::detail {
 
-/// A memory resource that hands out the WORKSPACE_SIZE bytes of its own storage first, one
-/// block after another, and then takes blocks from the heap and gives them back. A block of the
-/// storage is given back only when it is the last one handed out (a stack that grows leaves its
-/// earlier storage behind there; the heap gets back what it gave). One per parse, owned by the
-/// function that parses, so that calls share nothing. The standard's monotonic resource would
-/// do the first part, but it keeps every heap block too until it ends, and its allocation is a
-/// call into the library: here it is a few instructions.
-class Workspace final : public std::pmr::memory_resource {
+/// Hands out the WORKSPACE_SIZE bytes of its own storage first, one block after another, and
+/// then takes blocks from the heap and gives them back. A block of the storage is given back
+/// only when it is the last one handed out (a stack that grows leaves its earlier storage behind
+/// there; the heap gets back what it gave). One per parse, owned by the function that parses,
+/// so that calls share nothing. The standard's memory resources would need a virtual call per
+/// allocation, and its monotonic one keeps every heap block until it ends; here an allocation
+/// from the storage is a few inlined instructions.
+class Workspace {
   public:
     /// Enough for the stacks of a document nested a few dozen levels deep with a few dozen
     /// values per open container.
@@ -27,39 +28,78 @@ class Workspace final : public std::pmr::memory_resource {
     Workspace() = default;
     Workspace(const Workspace&) = delete;
     Workspace& operator=(const Workspace&) = delete;
-    ~Workspace() override = default;
+    ~Workspace() = default;
 
-    std::pmr::memory_resource* resource() { return this; }
-
-  private:
-    void* do_allocate(std::size_t bytes, std::size_t alignment) override {
+    /// `bytes` aligned for any type of at most `alignment`; throws std::bad_alloc.
+    void* allocate(std::size_t bytes, std::size_t alignment) {
         void* place = next;
         std::size_t space = WORKSPACE_SIZE - static_cast<std::size_t>(next - storage);
         if (std::align(alignment, bytes, place, space) != nullptr) {
             next = static_cast<std::byte*>(place) + bytes;
             return place;
         }
-        return heap()->allocate(bytes, alignment);
+        return ::operator new(bytes);
     }
-    void do_deallocate(void* block, std::size_t bytes, std::size_t alignment) override {
+    /// Gives back a block from allocate(); nothrow.
+    void deallocate(void* block, std::size_t bytes) noexcept {
         auto* const first = static_cast<std::byte*>(block);
         // std::less orders any two pointers; the built-in < only those into one array.
         const std::less<const std::byte*> before;
         if (before(first, storage) || !before(first, storage + WORKSPACE_SIZE)) {
-            heap()->deallocate(block, bytes, alignment);
+            ::operator delete(block, bytes);
         } else if (first + bytes == next) {
             next = first;
         }
     }
-    bool do_is_equal(const std::pmr::memory_resource& other) const noexcept override {
-        return this == &other;
-    }
-    // Named: the process-wide default resource could be replaced by anyone, at any time.
-    static std::pmr::memory_resource* heap() { return std::pmr::new_delete_resource(); }
 
+  private:
     alignas(std::max_align_t) std::byte storage[WORKSPACE_SIZE];
     std::byte* next = storage;
 };
+
+/// An allocator whose memory comes from a Workspace (for the element types of the working
+/// stacks, none over-aligned).
+template <typename T>
+class WorkspaceAllocator {
+  public:
+    using value_type = T;
+
+    // Implicit, so that a working stack is constructed from its Workspace.
+    WorkspaceAllocator(Workspace& workspace) noexcept // NOLINT(google-explicit-constructor)
+        : workspace(&workspace) {}
+    template <typename U>
+    WorkspaceAllocator(
+        const WorkspaceAllocator<U>& other) noexcept // NOLINT(google-explicit-constructor)
+        : workspace(other.workspace) {}
+
+    T* allocate(std::size_t count) {
+        if (count > std::size_t(-1) / sizeof(T)) {
+            throw std::bad_array_new_length();
+        }
+        return static_cast<T*>(workspace->allocate(count * sizeof(T), alignof(T)));
+    }
+    void deallocate(T* block, std::size_t count) noexcept {
+        workspace->deallocate(block, count * sizeof(T));
+    }
+
+    template <typename U>
+    bool operator==(const WorkspaceAllocator<U>& other) const noexcept {
+        return workspace == other.workspace;
+    }
+    template <typename U>
+    bool operator!=(const WorkspaceAllocator<U>& other) const noexcept {
+        return workspace != other.workspace;
+    }
+
+  private:
+    template <typename U>
+    friend class WorkspaceAllocator;
+    Workspace* workspace;
+};
+
+/// A working stack kept in a Workspace.
+template <typename T>
+using WorkspaceVector = std::vector<T, WorkspaceAllocator<T>>;
 
 } // namespace json::detail
 
