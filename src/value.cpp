@@ -391,12 +391,36 @@ void put_back(Value& from, Value& to) noexcept { // NOLINT(bugprone-exception-es
 
 } // namespace
 
+namespace {
+
+// One Value holds a container, the other a scalar or a string. The plain content steps aside
+// (moved, which cannot fail), the container's wrapper moves over (the one allocation: a new
+// wrapper takes the content without copying it), and the plain content takes the emptied
+// wrapper's place. If the allocation fails, the plain content goes back: both as they were.
+void swap_container_with_plain(detail::ValueVariant& container, detail::ValueVariant& plain) {
+    detail::ValueVariant aside(std::move(plain));
+    try {
+        plain = std::move(container);
+    } catch (...) {
+        plain = std::move(aside);
+        throw;
+    }
+    container = std::move(aside);
+}
+
+} // namespace
+
 void Value::swap(Value& other) { // NOLINT(bugprone-exception-escape): may throw, see value.hpp
     detail::ValueVariant& mine = *this;
     if (which() == other.which() || (!is_container(*this) && !is_container(other))) {
         // Same alternative: the contents (wrapper pointers, string buffers) are exchanged.
         // Otherwise boost::variant moves scalars and strings through a temporary.
         mine.swap(other);
+        return;
+    }
+    if (is_container(*this) != is_container(other)) {
+        swap_container_with_plain(is_container(*this) ? mine : other,
+                                  is_container(*this) ? other : mine);
         return;
     }
     Value held;
