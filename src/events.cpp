@@ -57,8 +57,8 @@ class Validator {
     bool boolean(bool) { return true; }
     // The literal is NUL-terminated (the grammar's copy).
     bool number(std::string_view literal) {
-        return !options.exact_numbers || held_exactly(literal, literal_to_double(literal)) ||
-               refusal.inexact(literal);
+        double value = 0.0;
+        return !options.exact_numbers || read_exactly(literal, value) || refusal.inexact(literal);
     }
     bool string(std::string_view) { return true; }
     bool key(std::string_view name) {

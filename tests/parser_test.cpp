@@ -384,19 +384,16 @@ TEST(ParseOptions, ExactNumbersAgreeWithTheWriter) {
     EXPECT_LT(refused, 19000);
 }
 
-// Numbers become the double nearest to them, whether converted directly (at most fifteen
-// digits and no exponent) or by the number-text library: literals of 1 to 18 digits with the
-// point anywhere, and the edges of the direct path, against strtod.
+// Numbers become the double nearest to them, whether converted directly (short literals, and
+// with exact_numbers digits below 2^53 with a power of ten up to 10^22) or by the number-text
+// library: literals of 1 to 18 digits with the point anywhere, and the edges of the direct
+// paths, against strtod, in both modes.
 TEST(Parser, NumbersBecomeTheNearestDouble) {
-    std::vector<std::string> literals = {"-0",
-                                         "-0.0",
-                                         "999999999999999",
-                                         "0.999999999999999",
-                                         "9999999999999999",
-                                         "0.000000000000001",
-                                         "0.0000000000000001",
-                                         "1.5e3",
-                                         "-2.5E-3"};
+    std::istringstream edges(
+        "-0 -0.0 -0e5 999999999999999 0.999999999999999 9999999999999999 0.000000000000001 "
+        "0.0000000000000001 1.5e3 -2.5E-3 9007199254740993 -9007199254740992e-22 "
+        "9007199254740991e22 123e-23 123e23");
+    std::vector<std::string> literals{std::istream_iterator<std::string>(edges), {}};
     std::mt19937_64 random(2026);
     for (std::size_t round = 0; round < 20000; ++round) {
         const std::string digits = std::to_string(random() | 1ULL << 63).substr(0, 1 + round % 18);
@@ -409,9 +406,13 @@ TEST(Parser, NumbersBecomeTheNearestDouble) {
         Value number;
         ASSERT_EQ(parse(literal, number), R::SUCCESS) << literal;
         const double expected = std::strtod(literal.c_str(), nullptr);
-        EXPECT_TRUE(number.as_number() == expected &&
-                    std::signbit(number.as_number()) == std::signbit(expected))
-            << literal;
+        Value exact = expected; // kept when exact_numbers refuses the literal
+        parse(literal, exact, options_from("x"));
+        for (const Value& read : {number, exact}) {
+            EXPECT_TRUE(read.as_number() == expected &&
+                        std::signbit(read.as_number()) == std::signbit(expected))
+                << literal;
+        }
     }
 }
 

@@ -49,11 +49,14 @@ namespace detail {
 /// it. Reports no failure of its own.
 JSONVALUE_API double string_to_double(const char* text);
 
-/// Whether the writer writes `value`, the double read from the JSON number `literal`, back as
-/// text that denotes the same decimal number (`1.50` and `1.5`, `1E2` and `100`, `-0` and `0`
-/// do). Constant time for literals of up to nineteen significant digits between 2^-8 and 2^53;
+/// Reads the NUL-terminated JSON number `literal` into `value`, the double string_to_double
+/// gives, and tells whether the writer writes that double back as text that denotes the same
+/// decimal number (`1.50` and `1.5`, `1E2` and `100`, `-0` and `0` do). The significand is
+/// read once for both: a literal whose digits are below 2^53 and whose power of ten is at most
+/// 10^22 either way is converted from it with one rounding, others by the number-text library.
+/// Constant time for literals of up to nineteen significant digits between 2^-5 and 2^53;
 /// other numbers are written out and compared digit by digit. Throws nothing.
-JSONVALUE_API bool is_written_back_exactly(std::string_view literal, double value) noexcept;
+JSONVALUE_API bool read_number_exactly(std::string_view literal, double& value) noexcept;
 
 /// The UTF-8 text of the `count` UTF-16 code units at `text` (no terminator needed; a 0 unit
 /// is converted like any other), converted by the text-encoding library. An unpaired

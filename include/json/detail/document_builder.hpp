@@ -67,17 +67,21 @@ inline double literal_to_double(std::string_view literal) {
     return negative ? -magnitude : magnitude;
 }
 
-/// Whether the writer writes `value`, read from the JSON number `literal`, back as the same
-/// decimal number. Up to fifteen significant digits (the literal has at least as many
-/// characters) come back unchanged from a normal double (DBL_DIG), and the writer writes every
-/// double below 2^53 with its shortest digits; anything else is checked against its text.
-inline bool held_exactly(std::string_view literal, double value) {
-    constexpr double exact_integers = 9007199254740992.0; // 2^53
-    const double magnitude = std::fabs(value);
-    if (literal.size() <= DBL_DIG && magnitude >= DBL_MIN && magnitude <= exact_integers) {
-        return true;
+/// Reads the JSON number `literal` (NUL-terminated) into `value` and tells whether the writer
+/// writes it back as the same decimal number. Up to fifteen significant digits (the literal
+/// has at least as many characters) come back unchanged from a normal double (DBL_DIG), and
+/// the writer writes every double below 2^53 with its shortest digits; anything else is read
+/// and checked in one pass by read_number_exactly.
+inline bool read_exactly(std::string_view literal, double& value) {
+    if (literal.size() <= DBL_DIG) {
+        constexpr double exact_integers = 9007199254740992.0; // 2^53
+        value = literal_to_double(literal);
+        const double magnitude = std::fabs(value);
+        if (magnitude >= DBL_MIN && magnitude <= exact_integers) {
+            return true;
+        }
     }
-    return is_written_back_exactly(literal, value);
+    return read_number_exactly(literal, value);
 }
 
 /// A handler's refusal of the document (the builder's, the validator's): which, and where
@@ -174,8 +178,10 @@ class DocumentBuilder {
     }
     // The literal is NUL-terminated (the grammar's copy), so it is read in place.
     bool number(std::string_view literal) {
-        const double value = literal_to_double(literal);
-        if (options.exact_numbers && !held_exactly(literal, value)) {
+        double value = 0.0;
+        if (!options.exact_numbers) {
+            value = literal_to_double(literal);
+        } else if (!read_exactly(literal, value)) {
             return refusal.inexact(literal);
         }
         push(Kind::NUMBER).number = value;
