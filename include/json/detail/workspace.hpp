@@ -46,7 +46,7 @@ class Workspace {
         // std::less orders any two pointers; the built-in < only those into one array.
         const std::less<const std::byte*> before;
         if (before(first, storage) || !before(first, storage + WORKSPACE_SIZE)) {
-            ::operator delete(block, bytes);
+            ::operator delete(block); // unsized: not every compiler declares the sized form
         } else if (first + bytes == next) {
             next = first;
         }
