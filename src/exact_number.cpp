@@ -9,7 +9,6 @@
 #include <array>
 #include <cmath>
 #include <cstdint>
-#include <cstdlib>
 #include <cstring>
 #include <optional>
 
@@ -264,25 +263,6 @@ Verdict shortest_digits_verdict(const Significand& literal, double value) {
     return down_reads_as_value || up_reads_as_value ? Verdict::INEXACT : Verdict::EXACT;
 }
 
-// The significand's value when one rounding gives it: its digits below 2^53 and its power of
-// ten at most 10^22 are both doubles exactly, so the one product or quotient is the double
-// nearest to the literal, as the number-text library's is.
-std::optional<double> directly_converted(const Significand& significand) {
-    constexpr std::uint64_t exact_integers = std::uint64_t{1} << 53U;
-    constexpr long long largest_exact_power = 22;
-    static constexpr double powers_of_ten[largest_exact_power + 1] = {
-        1e0,  1e1,  1e2,  1e3,  1e4,  1e5,  1e6,  1e7,  1e8,  1e9,  1e10, 1e11,
-        1e12, 1e13, 1e14, 1e15, 1e16, 1e17, 1e18, 1e19, 1e20, 1e21, 1e22};
-    const long long exponent = significand.last_exponent;
-    if (significand.digits > exact_integers || exponent < -largest_exact_power ||
-        exponent > largest_exact_power) {
-        return std::nullopt;
-    }
-    const auto digits = static_cast<double>(significand.digits);
-    const double power = powers_of_ten[std::abs(exponent)];
-    return exponent < 0 ? digits / power : digits * power;
-}
-
 // Whether `value`, read from `literal` (whose significand, when it has at most nineteen
 // digits, is given), is written back as the same decimal number.
 bool written_back_exactly(const std::optional<Significand>& significand, std::string_view literal,
@@ -311,7 +291,8 @@ bool written_back_exactly(const std::optional<Significand>& significand, std::st
 bool read_number_exactly(std::string_view literal, double& value) noexcept {
     const std::optional<Significand> significand = read_significand(literal);
     const std::optional<double> direct =
-        significand ? directly_converted(*significand) : std::nullopt;
+        significand ? scaled_exactly(significand->digits, significand->last_exponent)
+                    : std::nullopt;
     if (direct) {
         value = literal.front() == '-' ? -*direct : *direct;
     } else {

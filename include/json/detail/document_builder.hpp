@@ -23,16 +23,31 @@
 
 namespace json::detail {
 
+/// `digits` times ten to the power `exponent`, when one rounding gives it: digits below 2^53
+/// and a power of ten of at most 10^22 either way are both doubles exactly, so the one product
+/// or quotient is the double nearest to the number, as the number-text library gives it.
+/// Nothing otherwise.
+inline std::optional<double> scaled_exactly(std::uint64_t digits, long long exponent) {
+    constexpr std::uint64_t exact_integers = std::uint64_t{1} << 53U;
+    constexpr long long largest_exact_power = 22;
+    static constexpr double powers_of_ten[largest_exact_power + 1] = {
+        1e0,  1e1,  1e2,  1e3,  1e4,  1e5,  1e6,  1e7,  1e8,  1e9,  1e10, 1e11,
+        1e12, 1e13, 1e14, 1e15, 1e16, 1e17, 1e18, 1e19, 1e20, 1e21, 1e22};
+    if (digits > exact_integers || exponent < -largest_exact_power ||
+        exponent > largest_exact_power) {
+        return std::nullopt;
+    }
+    const auto number = static_cast<double>(digits);
+    const double power = powers_of_ten[exponent < 0 ? -exponent : exponent];
+    return exponent < 0 ? number / power : number * power;
+}
+
 /// The double nearest to a JSON number `literal` (NUL-terminated). A literal without an
-/// exponent whose digits, the point left out, number at most fifteen is converted here: those
-/// digits are an integer below 2^53 and the power of ten that scales it at most 10^15, both
-/// exact doubles, so the one division rounds once, to the nearest double, as the number-text
-/// library would. Most numbers in documents (counts, ids, coordinates, prices) take this path;
-/// the others go to the library.
+/// exponent whose digits, the point left out, number at most fifteen is converted here, by
+/// scaled_exactly: those digits are below 2^53 and the power of ten at most 10^15. Most numbers in
+/// documents (counts, ids, coordinates, prices) take this path; the others go to the library.
 inline double literal_to_double(std::string_view literal) {
     constexpr std::ptrdiff_t most_digits = 15;
-    static constexpr double powers_of_ten[most_digits + 1] = {
-        1e0, 1e1, 1e2, 1e3, 1e4, 1e5, 1e6, 1e7, 1e8, 1e9, 1e10, 1e11, 1e12, 1e13, 1e14, 1e15};
     // A sign, fifteen digits and a point at most: longer literals are not read twice.
     if (literal.size() > most_digits + 2) {
         return string_to_double(literal.data());
@@ -60,10 +75,7 @@ inline double literal_to_double(std::string_view literal) {
     if (next != end || count > most_digits) {
         return string_to_double(literal.data()); // an exponent, or too many digits
     }
-    double magnitude = static_cast<double>(digits);
-    if (decimals != 0) {
-        magnitude /= powers_of_ten[decimals];
-    }
+    const double magnitude = *scaled_exactly(digits, -decimals);
     return negative ? -magnitude : magnitude;
 }
 
