@@ -1,5 +1,7 @@
 #include <json/value.hpp>
 
+#include <boost/iterator/transform_iterator.hpp>
+
 #include <algorithm>
 #include <cstddef>
 #include <cstdlib>
@@ -101,6 +103,12 @@ detail::ValueVariant shallow_copy_of(const Value& source) {
     });
 }
 
+// The most elements an Array may have for its copy to look through them first: when none is a
+// non-empty container, the copy is built in one loop without a call per element. A longer
+// Array would no longer be in the cache for the second pass, which would then cost more than it
+// saves: such Arrays are copied in one pass.
+constexpr std::size_t LEAF_COPY_SIZE = 256;
+
 // The most children a container may have to count as shallow.
 constexpr std::size_t SHALLOW_SIZE = 8;
 
@@ -165,6 +173,16 @@ class TreeCopier {
     // container is filled, so that the container objects of one level lie together in memory,
     // as they lie in a parsed tree; destroying the copy walks them in that order.
     void copy_items(const Array& from, Array& to, int depth) {
+        if (from.size() <= LEAF_COPY_SIZE &&
+            std::none_of(from.begin(), from.end(), has_nested_content)) {
+            const auto as_variant = [](const Value& item) -> const detail::ValueVariant& {
+                return item;
+            };
+            Array copy(boost::make_transform_iterator(from.begin(), as_variant),
+                       boost::make_transform_iterator(from.end(), as_variant));
+            to.swap(copy);
+            return;
+        }
         to.reserve(from.size());
         bool nested = false; // set in the cases of containers only: nothing to test per number
         for (const Value& item : from) {

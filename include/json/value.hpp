@@ -178,6 +178,12 @@ class JSONVALUE_API Value : public detail::ValueVariant {
     /// Internal: copies `other`, but an Array or Object comes out empty.
     Value(detail::ShallowCopy, const Value& other);
 
+    /// Holds a copy of `content`, made by the variant's own copy constructor; the children of
+    /// an Array or Object in it are copied by the copy constructor above. Inline, so that a run
+    /// of scalars is copied into a new Array in one loop without a call per element.
+    /// Strong guarantee, as for the copy constructor.
+    explicit Value(const detail::ValueVariant& content) : detail::ValueVariant(content) {}
+
     /// Assigns a deep copy of `source`; returns *this. On std::bad_alloc:
     /// - same alternative: the target is left unchanged;
     /// - a string source: the target is left unchanged;
