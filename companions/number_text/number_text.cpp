@@ -49,25 +49,33 @@ constexpr std::array<double, 18> POWERS_OF_TEN = {1e0,  1e1,  1e2,  1e3,  1e4,  
                                                   1e6,  1e7,  1e8,  1e9,  1e10, 1e11,
                                                   1e12, 1e13, 1e14, 1e15, 1e16, 1e17};
 
-// `digits` with a decimal point `fraction_length` digits from its end (after "0." and zeros
-// when it has no more digits than that), after a minus sign when `negative`; returns the end.
+// The powers of ten from 10^0 to 10^17 as integers.
+constexpr auto INTEGER_POWERS_OF_TEN = [] {
+    std::array<std::uint64_t, 18> powers{};
+    std::uint64_t power = 1;
+    for (auto& entry : powers) {
+        entry = power;
+        power *= 10;
+    }
+    return powers;
+}();
+
+// `digits` with a decimal point `fraction_length` (1 to 17) digits from its end (after "0."
+// and zeros when it has no more digits than that), after a minus sign when `negative`; returns
+// the end. The integral part is written first; the fraction is written as 10^fraction_length
+// plus itself, whose leading 1 is then overwritten by the point: that writes its leading zeros
+// with it, and every byte lands in place without a copy.
 char* write_fixed(char* buffer, bool negative, std::uint64_t digits, std::size_t fraction_length) {
-    char text[std::numeric_limits<std::uint64_t>::digits10 + 1];
-    const auto length = static_cast<std::size_t>(
-        std::to_chars(std::begin(text), std::end(text), digits).ptr - text);
+    const std::uint64_t power = INTEGER_POWERS_OF_TEN.at(fraction_length);
     char* out = buffer;
     if (negative) {
         *out++ = '-';
     }
-    if (length > fraction_length) {
-        out = std::copy_n(text, length - fraction_length, out);
-    } else {
-        *out++ = '0';
-    }
-    *out++ = '.';
-    const std::size_t leading_zeros = fraction_length - std::min(length, fraction_length);
-    out = std::fill_n(out, leading_zeros, '0');
-    return std::copy(text + length - (fraction_length - leading_zeros), text + length, out);
+    out = std::to_chars(out, buffer + MAX_TEXT, digits / power).ptr;
+    char* const point = out;
+    out = std::to_chars(out, buffer + MAX_TEXT, power + digits % power).ptr;
+    *point = '.';
+    return out;
 }
 
 // The binary exponent e of a positive normal value: 2^e <= magnitude < 2^(e + 1).
