@@ -60,20 +60,21 @@ constexpr auto INTEGER_POWERS_OF_TEN = [] {
     return powers;
 }();
 
-// `digits` with a decimal point `fraction_length` (1 to 17) digits from its end (after "0."
-// and zeros when it has no more digits than that), after a minus sign when `negative`; returns
-// the end. The integral part is written first; the fraction is written as 10^fraction_length
-// plus itself, whose leading 1 is then overwritten by the point: that writes its leading zeros
-// with it, and every byte lands in place without a copy.
-char* write_fixed(char* buffer, bool negative, std::uint64_t digits, std::size_t fraction_length) {
-    const std::uint64_t power = INTEGER_POWERS_OF_TEN.at(fraction_length);
+// The integral part, a decimal point and `fraction` as `fraction_length` (1 to 17) digits with
+// its leading zeros, after a minus sign when `negative`; returns the end. The fraction is
+// written as 10^fraction_length plus itself, whose leading 1 is then overwritten by the point:
+// that writes its leading zeros with it, and every byte lands in place without a copy.
+char* write_fixed(char* buffer, bool negative, std::uint64_t integral, std::uint64_t fraction,
+                  std::size_t fraction_length) {
     char* out = buffer;
     if (negative) {
         *out++ = '-';
     }
-    out = std::to_chars(out, buffer + MAX_TEXT, digits / power).ptr;
+    out = std::to_chars(out, buffer + MAX_TEXT, integral).ptr;
     char* const point = out;
-    out = std::to_chars(out, buffer + MAX_TEXT, power + digits % power).ptr;
+    out =
+        std::to_chars(out, buffer + MAX_TEXT, INTEGER_POWERS_OF_TEN.at(fraction_length) + fraction)
+            .ptr;
     *point = '.';
     return out;
 }
@@ -168,8 +169,17 @@ char* write_short_fraction(char* buffer, Number value) {
     strip_zeros(4, 10'000);
     strip_zeros(2, 100);
     strip_zeros(1, 10);
-    return fraction_length == 0 ? nullptr // integral: not a fraction
-                                : write_fixed(buffer, value < 0, digits, fraction_length);
+    if (fraction_length == 0) {
+        return nullptr; // integral: not a fraction
+    }
+    // The decimal's last digit is not zero, so it lies at least 10^-k from any integer, farther
+    // than `value` lies from it (at most half a unit in the last place, less than a sixteenth of
+    // 10^-k at this scale): the two have the same integral part, and the conversion truncates
+    // to it.
+    const auto integral = static_cast<std::uint64_t>(magnitude);
+    return write_fixed(buffer, value < 0, integral,
+                       digits - integral * INTEGER_POWERS_OF_TEN.at(fraction_length),
+                       fraction_length);
 }
 
 template <typename Number>
