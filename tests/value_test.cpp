@@ -66,6 +66,27 @@ TEST(Value, CopiesAssignmentAndEquality) {
     EXPECT_EQ(all[6], samples()[6]);
 }
 
+// Short Arrays of scalars, strings and empty containers are copied in one loop, longer ones and
+// those holding a non-empty container element by element: each length around the limit, each
+// with and without a nested container at its end.
+TEST(Value, CopiesArraysOfEveryLength) {
+    const std::vector<Value> all = samples();
+    const Value leaves[] = {all[0], all[1], all[2], all[3], all[4], all[5], Array{}, Object{}};
+    for (const std::size_t length : {1, 2, 255, 256, 257, 1000}) {
+        Array items;
+        for (std::size_t i = 0; i < length; ++i) {
+            items.push_back(leaves[i % std::size(leaves)]);
+        }
+        for (const bool nested : {false, true}) {
+            if (nested) {
+                items.back() = all[6];
+            }
+            const Value source(items);
+            EXPECT_EQ(Value(source), source) << length << (nested ? " nested" : "");
+        }
+    }
+}
+
 // Arrays and objects that each hold a container beside the next level, deeper than the copy
 // recurses: the levels beyond are copied from its work list, several at each level. Each level
 // is swapped in, so that nothing but the last line copies the tree.
