@@ -169,9 +169,9 @@ class TreeCopier {
     }
 
     // Reserving first makes one allocation of the exact size, and keeps each element where it
-    // is built: a listed job may point to it. The elements are all built before any nested
-    // container is filled, so that the container objects of one level lie together in memory,
-    // as they lie in a parsed tree; destroying the copy walks them in that order.
+    // is built: a listed job may point to it. A nested container is filled as soon as its
+    // element is in, while the source element is still in the cache; walking the source a
+    // second time for them cost more than it saved in the order of allocations.
     void copy_items(const Array& from, Array& to, int depth) {
         if (from.size() <= LEAF_COPY_SIZE &&
             std::none_of(from.begin(), from.end(), has_nested_content)) {
@@ -184,18 +184,14 @@ class TreeCopier {
             return;
         }
         to.reserve(from.size());
-        bool nested = false; // set in the cases of containers only: nothing to test per number
         for (const Value& item : from) {
-            with_shallow_content(item, [&to, &nested](auto&& content) {
+            with_shallow_content(item, [this, &to, &item, depth](auto&& content) {
+                to.emplace_back(std::forward<decltype(content)>(content));
                 using Content = std::decay_t<decltype(content)>;
                 if constexpr (std::is_same_v<Content, Array> || std::is_same_v<Content, Object>) {
-                    nested = true;
+                    descend(item, to.back(), depth);
                 }
-                to.emplace_back(std::forward<decltype(content)>(content));
             });
-        }
-        if (nested) {
-            descend_all(from, to, depth);
         }
     }
 
@@ -204,7 +200,7 @@ class TreeCopier {
     // constructor of Value that it calls for each member copies a shallow container without
     // going further down, so this recursion is two levels deep at most. Any other object gets
     // its members one at a time; they come in ascending key order, so each goes after the last.
-    // As for an Array, nested containers are filled once all members are in.
+    // As for an Array, a nested container is filled as soon as its member is in.
     void copy_members(const Object& from, Object& to, int depth) {
         if (std::all_of(from.begin(), from.end(),
                         [](const auto& member) { return is_shallow(member.second); })) {
@@ -213,22 +209,12 @@ class TreeCopier {
             return;
         }
         for (const auto& source : from) {
-            with_shallow_content(source.second, [&to, &source](auto&& content) {
-                to.emplace_hint(to.end(), std::piecewise_construct,
-                                std::forward_as_tuple(source.first),
-                                std::forward_as_tuple(std::forward<decltype(content)>(content)));
+            const auto member = with_shallow_content(source.second, [&to, &source](auto&& content) {
+                return to.emplace_hint(
+                    to.end(), std::piecewise_construct, std::forward_as_tuple(source.first),
+                    std::forward_as_tuple(std::forward<decltype(content)>(content)));
             });
-        }
-        descend_all(from, to, depth);
-    }
-
-    // Fills the nested containers among the children of `to`, a shallow copy of `from`.
-    template <typename Container>
-    void descend_all(const Container& from, Container& to, int depth) {
-        auto target = to.begin();
-        for (const auto& source : from) {
-            descend(child_value(source), child_value(*target), depth);
-            ++target;
+            descend(source.second, member->second, depth);
         }
     }
 
