@@ -112,9 +112,11 @@ constexpr std::size_t LEAF_COPY_SIZE = 256;
 // The most children a container may have to count as shallow.
 constexpr std::size_t SHALLOW_SIZE = 8;
 
+// Whether `container` has at most `most_children` children, none of them a non-empty
+// container. Checking costs at most `most_children` steps.
 template <typename Container>
-bool holds_no_nested_content(const Container& container) {
-    return container.size() <= SHALLOW_SIZE &&
+bool holds_no_nested_content(const Container& container, std::size_t most_children) {
+    return container.size() <= most_children &&
            std::none_of(container.begin(), container.end(),
                         [](const auto& item) { return has_nested_content(child_value(item)); });
 }
@@ -125,9 +127,9 @@ bool holds_no_nested_content(const Container& container) {
 bool is_shallow(const Value& value) {
     switch (value.which()) {
     case ARRAY_INDEX:
-        return holds_no_nested_content(boost::get<Array>(value));
+        return holds_no_nested_content(boost::get<Array>(value), SHALLOW_SIZE);
     case OBJECT_INDEX:
-        return holds_no_nested_content(boost::get<Object>(value));
+        return holds_no_nested_content(boost::get<Object>(value), SHALLOW_SIZE);
     default:
         return true;
     }
@@ -173,8 +175,7 @@ class TreeCopier {
     // element is in, while the source element is still in the cache; walking the source a
     // second time for them cost more than it saved in the order of allocations.
     void copy_items(const Array& from, Array& to, int depth) {
-        if (from.size() <= LEAF_COPY_SIZE &&
-            std::none_of(from.begin(), from.end(), has_nested_content)) {
+        if (holds_no_nested_content(from, LEAF_COPY_SIZE)) {
             const auto as_variant = [](const Value& item) -> const detail::ValueVariant& {
                 return item;
             };
@@ -392,10 +393,6 @@ void put_back(Value& from, Value& to) noexcept { // NOLINT(bugprone-exception-es
         to = Value(false); // a scalar assignment: cannot fail
     }
 }
-
-} // namespace
-
-namespace {
 
 // One Value holds a container, the other a scalar or a string. The plain content steps aside
 // (moved, which cannot fail), the container's wrapper moves over (the one allocation: a new

@@ -44,11 +44,6 @@ char* write_exact_integer(char* buffer, Number value) {
     return digits <= scientific_length ? end : nullptr;
 }
 
-// Powers of ten from 10^0 to 10^17, each exact in a double, and up to 10^10 in a float.
-constexpr std::array<double, 18> POWERS_OF_TEN = {1e0,  1e1,  1e2,  1e3,  1e4,  1e5,
-                                                  1e6,  1e7,  1e8,  1e9,  1e10, 1e11,
-                                                  1e12, 1e13, 1e14, 1e15, 1e16, 1e17};
-
 // The powers of ten from 10^0 to 10^17 as integers.
 constexpr auto INTEGER_POWERS_OF_TEN = [] {
     std::array<std::uint64_t, 18> powers{};
@@ -56,6 +51,16 @@ constexpr auto INTEGER_POWERS_OF_TEN = [] {
     for (auto& entry : powers) {
         entry = power;
         power *= 10;
+    }
+    return powers;
+}();
+
+// The same powers as doubles: each is exact in a double (5^17 is below 2^53), and up to 10^10
+// in a float.
+constexpr auto POWERS_OF_TEN = [] {
+    std::array<double, INTEGER_POWERS_OF_TEN.size()> powers{};
+    for (std::size_t i = 0; i != powers.size(); ++i) {
+        powers.at(i) = static_cast<double>(INTEGER_POWERS_OF_TEN.at(i));
     }
     return powers;
 }();
