@@ -1,6 +1,7 @@
-#include "kind_message.hpp"
+#include "messages.hpp"
 
 #include <json/convert.hpp>
+#include <json/pointer.hpp>
 #include <json/serializer.hpp>
 
 #include <array>
@@ -22,16 +23,7 @@ std::string number_text(double number) {
 // `message` with "/token" in front of its pointer; a message without a pointer (a failure at
 // the Value converted) gets one, followed by ": ".
 std::string prefixed(const std::string& token, const char* message) {
-    std::string text = "/";
-    for (const char c : token) {
-        if (c == '~') {
-            text += "~0";
-        } else if (c == '/') {
-            text += "~1";
-        } else {
-            text += c;
-        }
-    }
+    std::string text = "/" + escape_pointer_token(token);
     if (message[0] != '/') {
         text += ": ";
     }
@@ -49,18 +41,6 @@ std::string prefixed(const std::string& token, const char* message) {
 }
 
 } // namespace
-
-std::string kind_message(const char* expected, const Value& found) {
-    // What the Value holds in JSON's terms, as `expected` is named: a float is a JSON number
-    // like a double, and Undefined is no JSON value at all.
-    static const char* const UNDEFINED_NAME = "no value";
-    static constexpr const char* const* NAMES[] = {
-        &UNDEFINED_NAME,       &traits<Null>::name,        &traits<bool>::name,
-        &traits<double>::name, &traits<std::string>::name, &traits<Array>::name,
-        &traits<Object>::name, &traits<double>::name,
-    };
-    return std::string("expected ") + expected + ", found " + *NAMES[found.which()];
-}
 
 void throw_wrong_kind(const char* expected, const Value& found) {
     throw std::invalid_argument(kind_message(expected, found));

@@ -1,4 +1,4 @@
-// Reading a Value: kinds, checked access, lookups, JSON Pointer, value_or, swap and the taking
+// Reading a Value: kinds, checked access, lookups, value_or, swap and the taking
 // constructors.
 #include "support/allocation_failure.hpp"
 #include "support/errors.hpp"
@@ -61,50 +61,6 @@ TEST(Access, KindsLookupsAndTheirErrors) {
     };
     for (const auto& [operation, message] : errors) {
         EXPECT_EQ(error_of(operation), message);
-    }
-}
-
-TEST(Access, JsonPointers) {
-    // The example document of RFC 6901, with every pointer it lists.
-    const Value doc = parsed(R"({"foo":["bar","baz"],"":0,"a/b":1,"c%d":2,"e^f":3,"g|h":4,
-        "i\\j":5,"k\"l":6," ":7,"m~n":8})");
-    const std::pair<const char*, const char*> found[] = {{"/foo", R"(["bar","baz"])"},
-                                                         {"/foo/0", R"("bar")"},
-                                                         {"/", "0"},
-                                                         {"/a~1b", "1"},
-                                                         {"/c%d", "2"},
-                                                         {"/e^f", "3"},
-                                                         {"/g|h", "4"},
-                                                         {"/i\\j", "5"},
-                                                         {"/k\"l", "6"},
-                                                         {"/ ", "7"},
-                                                         {"/m~0n", "8"}};
-    EXPECT_EQ(doc.find_pointer(""), &doc);
-    for (const auto& [pointer, text] : found) {
-        EXPECT_EQ(json::serialize(doc.at_pointer(pointer)), text) << pointer;
-    }
-    const std::pair<const char*, const char*> missing[] = {
-        {"/bar", "/bar: no member \"bar\""},
-        {"/foo/2", "/foo/2: index 2 out of range for a JSON array of 2 elements"},
-        {"/foo/-", "/foo/-: \"-\" is no index of a JSON array"},
-        {"/foo/01", "/foo/01: \"01\" is no index of a JSON array"},
-        {"/foo/0/x/y", "/foo/0/x: expected JSON object or array, found JSON string"},
-        {"/foo/18446744073709551614",
-         "/foo/18446744073709551614: index 18446744073709551614 out of range for a JSON array "
-         "of 2 elements"},
-        {"/foo/18446744073709551615",
-         "/foo/18446744073709551615: index 18446744073709551615 out of range for a JSON array "
-         "of 2 elements"},
-        {"/foo/123456789012345678901234567890",
-         "/foo/123456789012345678901234567890: index 123456789012345678901234567890 out of "
-         "range for a JSON array of 2 elements"},
-    };
-    for (const auto& [pointer, message] : missing) {
-        EXPECT_EQ(doc.find_pointer(pointer), nullptr) << pointer;
-        EXPECT_EQ(error_of([&] { doc.at_pointer(pointer); }), std::string("missing: ") + message);
-    }
-    for (const char* malformed : {"foo", "/m~2n", "/foo~", "/bar/~x"}) {
-        EXPECT_THROW(doc.find_pointer(malformed), std::invalid_argument) << malformed;
     }
 }
 

@@ -20,6 +20,7 @@
 #include <fcntl.h>
 #include <istream>
 #include <new>
+#include <optional>
 #include <ostream>
 #include <stdexcept>
 #include <string>
@@ -50,8 +51,8 @@ struct Settings {
     bool in_place = false;
     bool lossy = false;
     bool sort_keys = false;
-    std::string pointer;
-    bool has_pointer = false;
+    std::string pointer_text;
+    std::optional<json::Pointer> pointer; // --pointer, read
     std::string output_path;
     Layout layout;
     json::ParseOptions parse_options;
@@ -125,11 +126,11 @@ struct DocumentResult {
 template <typename Sink, typename Parse>
 DocumentResult parse_into(const Settings& settings, Sink& sink, Parse& parse) {
     DocumentResult result;
-    if (!settings.has_pointer) {
+    if (!settings.pointer) {
         result.report = parse(sink);
         return result;
     }
-    jsonfmt::PointerFilter<Sink> filter(settings.pointer, sink);
+    jsonfmt::PointerFilter<Sink> filter(*settings.pointer, sink);
     result.report = parse(filter);
     if (result.report) {
         result.pointer_problem = filter.problem();
@@ -514,7 +515,8 @@ bool read_arguments(int argc, char** argv, Settings& settings, int& status) {
         ->excludes("--indent")
         ->excludes("--tab")
         ->excludes("--library-layout");
-    app.add_option("-p,--pointer", settings.pointer, "write only the value at this JSON Pointer")
+    app.add_option("-p,--pointer", settings.pointer_text,
+                   "write only the value at this JSON Pointer")
         ->type_name("PTR");
     app.add_option("-o,--output", settings.output_path, "write to FILE, not standard output")
         ->type_name("FILE");
@@ -551,13 +553,12 @@ bool read_arguments(int argc, char** argv, Settings& settings, int& status) {
         status = TROUBLE;
         return true;
     }
-    settings.has_pointer = app.count("--pointer") != 0;
     choose_leniency(settings.parse_options, settings.lossy);
     settings.write_options = chosen_layout(settings.layout, settings.lines);
     std::string usage_error;
-    if (settings.has_pointer) {
+    if (app.count("--pointer") != 0) {
         try {
-            json::Value().find_pointer(settings.pointer);
+            settings.pointer.emplace(settings.pointer_text);
         } catch (const std::invalid_argument& error) {
             usage_error = std::string("--pointer: ") + error.what();
         }
@@ -572,7 +573,7 @@ bool read_arguments(int argc, char** argv, Settings& settings, int& status) {
     if (settings.in_place && !settings.output_path.empty()) {
         usage_error = "--in-place writes back into each FILE: it does not go with --output";
     }
-    if (settings.in_place && (settings.check_only || settings.has_pointer)) {
+    if (settings.in_place && (settings.check_only || settings.pointer)) {
         usage_error = "--in-place rewrites whole files: it goes with neither --check nor --pointer";
     }
     if (!settings.output_path.empty() && is_one_of(settings.output_path, settings.files)) {

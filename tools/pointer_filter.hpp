@@ -3,6 +3,8 @@
 
 // --pointer: of the parsing events of a document, only those of the value at a JSON Pointer.
 
+#include <json/pointer.hpp>
+
 #include <cstddef>
 #include <string>
 #include <string_view>
@@ -10,8 +12,8 @@
 
 namespace jsonfmt {
 
-/// Follows a JSON Pointer (RFC 6901, already checked to be well-formed) through the events of
-/// one document and says which events belong to the value it refers to. Memory: the pointer
+/// Follows a JSON Pointer through the events of one document and says which events belong to
+/// the value it refers to. Memory: the pointer
 /// and one entry per container on its path.
 ///
 /// The value is found where the pointer's member names and indexes lead; when the path leaves
@@ -20,13 +22,11 @@ namespace jsonfmt {
 /// is a problem too, found wherever the second member stands (so the whole document is read).
 class PointerPath {
   public:
-    enum class Kind { null, boolean, number, string, array, object };
-
-    explicit PointerPath(std::string_view pointer);
+    explicit PointerPath(const json::Pointer& pointer) : pointer(pointer) {}
 
     /// A value of `kind` starts (a container opens): whether it belongs to the value at the
     /// pointer.
-    bool value(Kind kind);
+    bool value(json::Kind kind);
     /// A member name: whether it belongs to the value at the pointer.
     bool key(std::string_view name);
     /// A container closes: whether it belongs to the value at the pointer.
@@ -38,12 +38,6 @@ class PointerPath {
     std::string problem() const;
 
   private:
-    struct Step {
-        std::string token; // as written in the pointer
-        std::string name;  // the member name it stands for ("~1" is '/', "~0" is '~')
-        std::size_t index; // the element it stands for, or npos when it is no index
-        std::size_t end;   // where it ends in the pointer
-    };
     // A container on the path: the value at the first `level` steps, for level = its place.
     struct Open {
         bool is_object;
@@ -53,10 +47,9 @@ class PointerPath {
     };
 
     bool is_wanted_next();
-    void fail(std::size_t step, std::string reason);
+    void fail(std::size_t step, const std::string& reason);
 
-    std::string pointer;
-    std::vector<Step> steps;
+    const json::Pointer& pointer;
     std::vector<Open> path;     // the containers on the path that are open, outermost first
     std::size_t depth = 0;      // the containers open outside the value at the pointer
     std::size_t value_open = 0; // the containers open inside the value at the pointer
@@ -70,25 +63,25 @@ class PointerPath {
 template <typename Next>
 class PointerFilter {
   public:
-    PointerFilter(std::string_view pointer, Next& next) : path(pointer), next(next) {}
+    PointerFilter(const json::Pointer& pointer, Next& next) : path(pointer), next(next) {}
 
-    bool null() { return !path.value(Kind::null) || next.null(); }
-    bool boolean(bool value) { return !path.value(Kind::boolean) || next.boolean(value); }
+    bool null() { return !path.value(Kind::NULL_VALUE) || next.null(); }
+    bool boolean(bool value) { return !path.value(Kind::BOOLEAN) || next.boolean(value); }
     bool number(std::string_view literal) {
-        return !path.value(Kind::number) || next.number(literal);
+        return !path.value(Kind::NUMBER) || next.number(literal);
     }
-    bool string(std::string_view utf8) { return !path.value(Kind::string) || next.string(utf8); }
+    bool string(std::string_view utf8) { return !path.value(Kind::STRING) || next.string(utf8); }
     bool key(std::string_view utf8) { return !path.key(utf8) || next.key(utf8); }
-    bool begin_array() { return !path.value(Kind::array) || next.begin_array(); }
+    bool begin_array() { return !path.value(Kind::ARRAY) || next.begin_array(); }
     bool end_array() { return !path.close() || next.end_array(); }
-    bool begin_object() { return !path.value(Kind::object) || next.begin_object(); }
+    bool begin_object() { return !path.value(Kind::OBJECT) || next.begin_object(); }
     bool end_object() { return !path.close() || next.end_object(); }
 
     /// See PointerPath::problem().
     std::string problem() const { return path.problem(); }
 
   private:
-    using Kind = PointerPath::Kind;
+    using Kind = json::Kind;
     PointerPath path;
     Next& next;
 };

@@ -7,6 +7,7 @@
 #include <json/convert.hpp>
 #include <json/events.hpp>
 #include <json/parse.hpp>
+#include <json/pointer.hpp>
 #include <json/serializer.hpp>
 #include <json/value.hpp>
 #include <json/writer.hpp>

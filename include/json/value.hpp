@@ -2,6 +2,7 @@
 #define JSON_VALUE_HPP
 
 #include <json/detail/export.hpp>
+#include <json/kind.hpp>
 
 #include <boost/variant.hpp>
 
@@ -60,11 +61,6 @@ enum Alternative : int {
 /// Selects the constructor that copies a Value but leaves an Array or Object empty; the deep
 /// copy starts from it and fills the containers itself.
 struct ShallowCopy {};
-
-/// The member name a reference token of a well-formed JSON Pointer stands for: "~1" is '/',
-/// "~0" is '~'. For whatever follows a pointer through a document (Value::find_pointer,
-/// jsonfmt's --pointer through parsing events). Linear. Throws std::bad_alloc.
-JSONVALUE_API std::string pointer_member_name(std::string_view token);
 
 } // namespace detail
 
@@ -219,6 +215,12 @@ class JSONVALUE_API Value : public detail::ValueVariant {
     bool is_string() const noexcept { return which() == detail::STRING_INDEX; } ///< a string?
     bool is_array() const noexcept { return which() == detail::ARRAY_INDEX; }   ///< an Array?
     bool is_object() const noexcept { return which() == detail::OBJECT_INDEX; } ///< an Object?
+    /// The kind of JSON value held (a float is a NUMBER).
+    Kind kind() const noexcept {
+        constexpr Kind KINDS[] = {Kind::UNDEFINED, Kind::NULL_VALUE, Kind::BOOLEAN, Kind::NUMBER,
+                                  Kind::STRING,    Kind::ARRAY,      Kind::OBJECT,  Kind::NUMBER};
+        return KINDS[which()];
+    }
 
     // Checked access: the value held, of the kind asked for. Constant time. Each throws
     // std::invalid_argument when the Value holds another kind, naming both kinds: "expected
@@ -261,18 +263,20 @@ class JSONVALUE_API Value : public detail::ValueVariant {
     const Value& at(std::size_t index) const;
 
     /// The value that the JSON Pointer (RFC 6901) `pointer` refers to, or null when there is
-    /// none. "" is this Value itself; each "/token" goes one level down, into the member of
-    /// that name (with "~1" standing for '/' and "~0" for '~') or the element at that index
-    /// (decimal digits, no leading zero; "-" refers to no element). Linear in the length of
-    /// the pointer, logarithmic per Object. Throws std::invalid_argument when the pointer is
-    /// malformed: not empty and not starting with '/', or with '~' not followed by '0' or '1'.
+    /// none: json::Pointer(pointer).find(*this) (json/pointer.hpp). "" is this Value itself;
+    /// each "/token" goes one level down, into the member of that name (with "~1" standing for
+    /// '/' and "~0" for '~') or the element at that index (decimal digits, no leading zero;
+    /// "-" refers to no element). Linear in the length of the pointer, logarithmic per Object.
+    /// Throws std::invalid_argument when the pointer is malformed: not empty and not starting
+    /// with '/', or with '~' not followed by '0' or '1'; and std::bad_alloc.
     Value* find_pointer(std::string_view pointer);
     /// @copydoc find_pointer
     const Value* find_pointer(std::string_view pointer) const;
-    /// The value that `pointer` refers to, as find_pointer finds it. Throws
-    /// std::out_of_range when there is none, with a message that begins with the pointer up to
-    /// the first token not found ("/servers/3: index 3 out of range for a JSON array of 2
-    /// elements"), and std::invalid_argument when the pointer is malformed.
+    /// The value that `pointer` refers to, as find_pointer finds it:
+    /// json::Pointer(pointer).at(*this). Throws std::out_of_range when there is none, with a
+    /// message that begins with the pointer up to the first token not found ("/servers/3: index 3
+    /// out of range for a JSON array of 2 elements"), and std::invalid_argument when the pointer is
+    /// malformed.
     Value& at_pointer(std::string_view pointer);
     /// @copydoc at_pointer
     const Value& at_pointer(std::string_view pointer) const;
