@@ -23,28 +23,33 @@ void set_bad_without_throwing(std::istream& in) {
     }
 }
 
-// Appends what `buffer` holds, up to `count` bytes, or when it holds nothing, up to `count`
-// bytes read through it; false at the end of the stream. Taking what the buffer holds on its
-// own means that a buffer that throws when it refills has given every byte before into
-// `text`. xsgetn stops short only at the end of the stream.
+// Appends up to `count` bytes of `buffer`; false when it has ended. Only bytes the buffer holds
+// are taken, so that every byte it handed over is in `text` before it is asked to refill: a
+// buffer that throws while it refills has given all the bytes before the failure. Once some
+// bytes are in, it is asked for more only when it says more are there (showmanyc), so that
+// text from a pipe is taken as it comes, not when `count` bytes have come.
 bool append_from(std::streambuf& buffer, std::string& text, std::size_t count) {
-    const std::streamsize held = buffer.in_avail();
-    if (held < 0) {
-        return false;
+    using traits = std::streambuf::traits_type;
+    std::size_t appended = 0;
+    while (appended < count) {
+        if (appended != 0 && buffer.in_avail() <= 0) {
+            return true;
+        }
+        if (traits::eq_int_type(buffer.sgetc(), traits::eof())) { // refills an empty buffer
+            return false;
+        }
+        // What the refilled buffer holds; a buffer without a get area gives one byte at a time.
+        const std::streamsize held = buffer.in_avail();
+        const std::size_t taken =
+            held > 0 ? std::min(static_cast<std::size_t>(held), count - appended) : 1;
+        const std::size_t before = text.size();
+        text.resize(before + taken);
+        const std::streamsize got =
+            buffer.sgetn(&text[before], static_cast<std::streamsize>(taken));
+        text.resize(before + static_cast<std::size_t>(got));
+        appended += static_cast<std::size_t>(got);
     }
-    const auto wanted = static_cast<std::streamsize>(count);
-    const std::streamsize asked = held > 0 ? std::min(held, wanted) : wanted;
-    const std::size_t before = text.size();
-    text.resize(before + static_cast<std::size_t>(asked));
-    std::streamsize got = 0;
-    try {
-        got = buffer.sgetn(&text[before], asked);
-    } catch (...) {
-        text.resize(before);
-        throw;
-    }
-    text.resize(before + static_cast<std::size_t>(got));
-    return got == asked;
+    return true;
 }
 
 // The handler of json::validate: builds nothing, and applies the options that concern a

@@ -4,11 +4,14 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <fstream>
+#include <functional>
 #include <sstream>
 #include <stdexcept>
 #include <streambuf>
 #include <string>
+#include <tuple>
 
 namespace {
 
@@ -30,6 +33,80 @@ class BrokenBuffer : public std::streambuf {
     int_type underflow() override { throw DiskGone(); }
     std::string text;
 };
+
+// A stream buffer that refills `refill` bytes at a time from `text` and throws once `limit`
+// bytes have been handed over: the failure lies just after the last byte it delivered.
+class FailingAfter : public std::streambuf {
+  public:
+    FailingAfter(std::string text, std::size_t refill, std::size_t limit)
+        : text(std::move(text)), refill(refill), limit(limit) {}
+
+  private:
+    int_type underflow() override {
+        if (delivered == limit) {
+            throw DiskGone();
+        }
+        const std::size_t size = std::min({refill, limit - delivered, text.size() - delivered});
+        if (size == 0) {
+            return traits_type::eof();
+        }
+        char* const first = text.data() + delivered;
+        setg(first, first, first + size);
+        delivered += size;
+        return traits_type::to_int_type(*first);
+    }
+
+    std::string text;
+    std::size_t refill;
+    std::size_t limit;
+    std::size_t delivered = 0;
+};
+
+// Whatever the size of the buffer's refills, a buffer that fails after N bytes is reported at
+// offset N, on the line and column of that place, by every reader of streams.
+TEST(ParseStream, AFailureIsPlacedAfterTheLastByteDelivered) {
+    std::string text = "[";
+    while (text.size() < 200'000) {
+        text += "\"1234567\",\n";
+    }
+    text.back() = ']';
+    const auto position = [&text](std::size_t offset) {
+        const auto lines = static_cast<std::size_t>(
+            std::count(text.begin(), text.begin() + static_cast<std::ptrdiff_t>(offset), '\n'));
+        const std::size_t line_start = text.rfind('\n', offset - 1);
+        return std::make_tuple(offset, lines + 1,
+                               offset - (line_start == std::string::npos ? 0 : line_start + 1) + 1);
+    };
+    using Reader = std::function<json::ParseReport(std::istream&)>;
+    const std::pair<const char*, Reader> readers[] = {
+        {"parse",
+         [](std::istream& in) {
+             Value out;
+             return json::parse(in, out, {});
+         }},
+        {"parse_events",
+         [](std::istream& in) {
+             json::NoOpHandler handler;
+             return json::parse_events(in, handler);
+         }},
+        {"validate", [](std::istream& in) { return json::validate(in); }},
+    };
+    for (const std::size_t refill : {std::size_t{1}, std::size_t{4096}, std::size_t{65536}}) {
+        for (const std::size_t limit :
+             {std::size_t{1}, std::size_t{5}, std::size_t{4096}, std::size_t{16384},
+              std::size_t{65537}, std::size_t{150000}}) {
+            for (const auto& [name, read] : readers) {
+                FailingAfter buffer(text, refill, limit);
+                std::istream in(&buffer);
+                const json::ParseReport report = read(in);
+                EXPECT_EQ(report.note, "the stream failed while it was read") << name;
+                EXPECT_EQ(std::make_tuple(report.offset, report.line, report.column),
+                          position(limit))
+                    << name << " refilling " << refill << " failing after " << limit;
+            }
+        }
+    }
+}
 
 TEST(ParseStream, DocumentsAndTheirFailures) {
     std::istringstream good("  {\"a\": [1, 2]}\n");
