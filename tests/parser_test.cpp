@@ -117,6 +117,11 @@ TEST(Parser, Failures) {
     };
     EXPECT_EQ(message("[\n  1,\n  2 3\n]"),
               "3:5 No trailing ']' while parsing value of type array (possible missing comma?)");
+    // A carriage return ends a line, alone or before a line feed.
+    EXPECT_EQ(message("[1,\r2,\rx]"),
+              "3:1 Expected leading digit while parsing value of type number "
+              "(no JSON value starts here)");
+    EXPECT_EQ(message("[1,\r\n2,\n\r x]").substr(0, 4), "4:2 ");
     EXPECT_EQ(message("{} x"),
               "1:4 Unexpected end of input (the text goes on after the JSON value)");
     EXPECT_EQ(message(std::string(513, '[')),
@@ -128,7 +133,7 @@ TEST(Parser, Failures) {
 }
 
 // Options from letters: c comments, t trailing commas, u invalid UTF-8, s lone surrogates,
-// d duplicates refused, x exact numbers.
+// d duplicates refused, x exact numbers, b byte order mark skipped.
 ParseOptions options_from(std::string_view letters) {
     ParseOptions options;
     options.allow_comments = letters.find('c') != std::string_view::npos;
@@ -137,14 +142,15 @@ ParseOptions options_from(std::string_view letters) {
     options.allow_lone_surrogates = letters.find('s') != std::string_view::npos;
     options.reject_duplicate_keys = letters.find('d') != std::string_view::npos;
     options.exact_numbers = letters.find('x') != std::string_view::npos;
+    options.allow_bom = letters.find('b') != std::string_view::npos;
     return options;
 }
 
 // "=" and the compact text of what `text` parses to, or "@offset #code" and the refusal;
 // checks that a failure leaves `out` alone.
 std::string outcome(std::string_view text, std::string_view letters) {
-    static constexpr const char* REFUSALS[] = {"",          "too deep",  "bad UTF-8",
-                                               "surrogate", "duplicate", "inexact"};
+    static constexpr const char* REFUSALS[] = {"",          "too deep", "bad UTF-8", "surrogate",
+                                               "duplicate", "inexact",  "stopped",   "bom"};
     Value out = "untouched";
     const ParseReport report = parse(text, out, options_from(letters));
     if (report) {
@@ -195,6 +201,11 @@ TEST(ParseOptions, RefusedUnlessAllowed) {
         {"[1,]", "t", "=[1]"},
         {R"({"a":1,})", "", "@7 #8"},
         {R"({"a":1,})", "t", R"(={"a":1})"},
+        {"\xEF\xBB\xBF[1]", "", "@0 #11 bom"},
+        {"\xEF\xBB\xBF[1]", "b", "=[1]"},
+        {"\xEF\xBB\xBF", "b", "@3 #3"},
+        {"\xEF\xBB", "b", "@0 #11"},
+        {" \xEF\xBB\xBF[1]", "b", "@1 #11"},
     });
     const std::tuple<std::string, std::string, std::string> notes[] = {
         {"[1 // one\n]", "", "comments are not JSON; the allow_comments option accepts them"},
@@ -208,7 +219,9 @@ TEST(ParseOptions, RefusedUnlessAllowed) {
         {R"({"a":1,"a":2})", "d", "already has a member of this name"},
         {"[1 /* open", "c", "the comment is not closed"},
         {"[1 / 2]", "c", "a comment starts with // or /*"},
-        {std::string(513, '['), "", "nested deeper than the maximum depth"}};
+        {std::string(513, '['), "", "nested deeper than the maximum depth"},
+        {"\xEF\xBB\xBF{}", "",
+         "a UTF-8 byte order mark (EF BB BF) is not JSON; ParseOptions::allow_bom skips it"}};
     for (const auto& [text, letters, note] : notes) {
         Value out;
         const ParseReport report = parse(text, out, options_from(letters));

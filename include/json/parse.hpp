@@ -90,6 +90,9 @@ struct ParseOptions {
     bool allow_lone_surrogates = false;
     /// Refuse an object that names a member twice. Off: the last member of that name wins.
     bool reject_duplicate_keys = false;
+    /// Skip a UTF-8 byte order mark (EF BB BF) before the text. Off: refused, with
+    /// Refusal::BYTE_ORDER_MARK (RFC 8259 forbids writing one and lets a parser ignore it).
+    bool allow_bom = false;
     /// Refuse a number unless the double it becomes is written back by this library as the
     /// same decimal number (`1.50`, `1E2`, `-0`, `0.1` pass; `1e400`, `1e-400`,
     /// `9007199254740993`, `0.10000000000000001` are refused). Costs nothing extra for numbers
@@ -99,13 +102,14 @@ struct ParseOptions {
 
 /// Why a text that is JSON (or that the options admit) was refused all the same.
 enum class Refusal {
-    NONE,           ///< not refused: parsed, or failed on the grammar
-    TOO_DEEP,       ///< nested deeper than ParseOptions::max_depth
-    INVALID_UTF8,   ///< a string or member name that is not well-formed UTF-8
-    LONE_SURROGATE, ///< a \u escape of a surrogate without its other half
-    DUPLICATE_KEY,  ///< a member name given twice, with reject_duplicate_keys
-    INEXACT_NUMBER, ///< a number a double cannot hold exactly, with exact_numbers
-    STOPPED,        ///< a handler of json::parse_events returned false
+    NONE,            ///< not refused: parsed, or failed on the grammar
+    TOO_DEEP,        ///< nested deeper than ParseOptions::max_depth
+    INVALID_UTF8,    ///< a string or member name that is not well-formed UTF-8
+    LONE_SURROGATE,  ///< a \u escape of a surrogate without its other half
+    DUPLICATE_KEY,   ///< a member name given twice, with reject_duplicate_keys
+    INEXACT_NUMBER,  ///< a number a double cannot hold exactly, with exact_numbers
+    STOPPED,         ///< a handler of json::parse_events returned false
+    BYTE_ORDER_MARK, ///< a UTF-8 byte order mark before the text, without allow_bom
 };
 
 /// The detailed outcome of json::parse: the code, and for a failure where it happened and,
@@ -117,9 +121,10 @@ enum class Refusal {
 /// string is: a byte that cannot stand there), LONE_SURROGATE with INVALID_UNICODE_ESCAPE,
 /// DUPLICATE_KEY with MISSING_TRAILING_BRACE (the object cannot be completed as written) and
 /// INEXACT_NUMBER with INVALID_EXPONENT (the number's magnitude or precision is beyond a
-/// double's). The position is that of the first byte of the ill-formed UTF-8 sequence, the
-/// backslash of the unpaired escape, the opening quote of the second member name, or the first
-/// character of the number.
+/// double's), BYTE_ORDER_MARK with MISSING_LEADING_DIGIT (no value starts with it). The
+/// position is that of the first byte of the ill-formed UTF-8 sequence, the backslash of the
+/// unpaired escape, the opening quote of the second member name, the first character of the
+/// number, or the start of the text.
 struct ParseReport {
     ParseResult result = ParseResult::SUCCESS; ///< the outcome
     std::size_t offset = 0;                    ///< byte offset of the failure in the text
@@ -144,19 +149,39 @@ struct ParseReport {
 namespace detail {
 
 /// Where a text read so far stands: how many bytes lie before a point of it, on which line
-/// that point is and where that line starts. The pieces of a stream are counted as they are
-/// left behind, so that a failure in the piece at hand is placed from the start of the text.
+/// that point is and where that line starts. A line ends with a line feed, a carriage return,
+/// or both in that order (one line end). The pieces of a stream are counted as they are left
+/// behind, so that a failure in the piece at hand is placed from the start of the text.
 struct TextPosition {
     std::size_t offset = 0;     // bytes counted
     std::size_t line = 1;       // the line `offset` is on
     std::size_t line_start = 0; // the offset of that line's first byte
+    bool after_return = false;  // the last byte counted was a carriage return
 
     void advance(std::string_view text) {
-        const std::size_t last_newline = text.rfind('\n');
-        if (last_newline != std::string_view::npos) {
-            line += static_cast<std::size_t>(std::count(text.begin(), text.end(), '\n'));
-            line_start = offset + last_newline + 1;
+        if (text.empty()) {
+            return;
         }
+        if (text.find('\r') == std::string_view::npos && !after_return) {
+            // Line feeds alone, as in most texts: counted at once.
+            const std::size_t last_newline = text.rfind('\n');
+            if (last_newline != std::string_view::npos) {
+                line += static_cast<std::size_t>(std::count(text.begin(), text.end(), '\n'));
+                line_start = offset + last_newline + 1;
+            }
+        } else {
+            for (std::size_t at = 0; at < text.size(); ++at) {
+                if (text[at] != '\n' && text[at] != '\r') {
+                    continue;
+                }
+                // The line feed of a CR LF pair ends no line of its own.
+                const bool pair_end =
+                    text[at] == '\n' && (at == 0 ? after_return : text[at - 1] == '\r');
+                line += pair_end ? 0 : 1;
+                line_start = offset + at + 1;
+            }
+        }
+        after_return = text.back() == '\r';
         offset += text.size();
     }
 

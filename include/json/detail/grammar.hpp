@@ -152,6 +152,7 @@ class Grammar {
         return true;
     }
     bool skip_comments();
+    ParseResult byte_order_mark();
     [[gnu::always_inline]] const char* find_string_stop(const char* from) const {
 #if defined(__SSE2__)
         // Most strings and names are shorter than sixteen bytes and plain ASCII: when the first
@@ -183,6 +184,7 @@ class Grammar {
     const char* token = nullptr;  // where the token being read started
     bool last = true;             // nothing follows `end`
     Expect expect = Expect::VALUE;
+    bool at_start = true; // nothing of the text is read yet
     // 1 for an object, 0 for an array, innermost last (bytes: a std::vector<bool> costs a bit
     // operation on every access).
     WorkspaceVector<unsigned char> open_containers;
@@ -202,6 +204,11 @@ ParseResult Grammar<Handler>::feed(const char* from, const char* to, bool is_las
     token = from;
     end = to;
     last = is_last;
+    if (at_start) {
+        if (const ParseResult result = byte_order_mark(); result != ParseResult::SUCCESS) {
+            return result;
+        }
+    }
     for (;;) {
         if (!skip_whitespace()) {
             return NEED_MORE; // the cursor is on the comment the piece cuts
@@ -561,6 +568,30 @@ inline ParseResult Grammar<Handler>::number() {
     return tell_value([this, literal_text, length] {
         return handler.number(std::string_view(literal_text, length));
     });
+}
+
+// A UTF-8 byte order mark at the start of the text is skipped or refused; SUCCESS once what
+// starts the text is known to be none (or was skipped).
+template <typename Handler>
+ParseResult Grammar<Handler>::byte_order_mark() {
+    static constexpr std::string_view mark = "\xEF\xBB\xBF";
+    const auto available = std::min(static_cast<std::size_t>(end - cursor), mark.size());
+    const bool could_be_mark = std::string_view(cursor, available) == mark.substr(0, available);
+    if (available < mark.size() && could_be_mark && !last) {
+        return need_more(); // the next piece tells
+    }
+    if (available < mark.size() || !could_be_mark) {
+        at_start = false; // the grammar reads what is there
+        return ParseResult::SUCCESS;
+    }
+    if (!options.allow_bom) {
+        return refuse(Refusal::BYTE_ORDER_MARK, ParseResult::MISSING_LEADING_DIGIT,
+                      "a UTF-8 byte order mark (EF BB BF) is not JSON; ParseOptions::allow_bom "
+                      "skips it");
+    }
+    cursor += mark.size();
+    at_start = false;
+    return ParseResult::SUCCESS;
 }
 
 // Records the note of a failure at the cursor. A failure on a '/' that starts what looks like
