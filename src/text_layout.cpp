@@ -72,21 +72,8 @@ TextLayout::TextLayout(OutputBuffer& buffer, const WriteOptions& options)
       indent_width(options.indent_with_tab ? 1 : options.indent),
       escapes(options.escape_slash ? (options.ascii_only ? Escapes::slash_and_high : Escapes::slash)
                                    : (options.ascii_only ? Escapes::high : Escapes::none)),
-      colon{':', ' '}, colon_size(options.space_after_colon ? 2 : 1) {}
-
-void TextLayout::check_utf8(std::string_view text) {
-    const char* const end = text.data() + text.size();
-    for (const char* at = text.data(); at != end; ++at) {
-        // Stops at a byte to escape, which is fine, or at an ill-formed one.
-        at = find_special_or_ill_formed<false>(at, end);
-        if (at == end) {
-            break;
-        }
-        if (static_cast<unsigned char>(*at) >= 0x80) {
-            throw_ill_formed(static_cast<std::size_t>(at - text.data()));
-        }
-    }
-}
+      colon{':', ' '}, colon_size(options.space_after_colon ? 2 : 1),
+      reject_non_finite(options.reject_non_finite) {}
 
 // Calls `write` with the escape set as two std::bool_constant arguments: the slash, and the
 // bytes from 0x80 up.
@@ -248,8 +235,20 @@ void TextLayout::number(float number) {
 
 // NaN and the infinities are written as strings; every finite number is formatted by the
 // number-text library straight into 80 zeroed bytes of the buffer, then kept up to its NUL.
+void TextLayout::check_finite(double number) const {
+    if (reject_non_finite && !std::isfinite(number)) {
+        throw std::invalid_argument(std::string("json: ") +
+                                    (std::isnan(number) ? "NaN"
+                                     : number > 0       ? "Inf"
+                                                        : "-Inf") +
+                                    " has no JSON number, and WriteOptions::reject_non_finite "
+                                    "refuses to write it as a string");
+    }
+}
+
 template <typename Number>
 void TextLayout::formatted_number(Number number, int (*format)(char*, Number)) {
+    check_finite(number);
     if (std::isnan(number)) {
         buffer.append("\"NaN\"", 5);
     } else if (number > std::numeric_limits<Number>::max()) {

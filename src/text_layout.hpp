@@ -34,26 +34,28 @@ class TextLayout {
             buffer.append("false", 5);
         }
     }
-    /// The number's shortest text; NaN and the infinities as the strings "NaN", "Inf", "-Inf".
+    /// The number's shortest text; NaN and the infinities as the strings "NaN", "Inf", "-Inf",
+    /// or refused as check_finite() refuses them with WriteOptions::reject_non_finite.
     void number(double number);
     void number(float number);
+    /// Throws std::invalid_argument when the options refuse NaN and the infinities and
+    /// `number` is one of them.
+    void check_finite(double number) const;
     /// A number's text as it is (the caller has checked that it is one).
     void number_text(std::string_view text) { buffer.append(text.data(), text.size()); }
 
-    /// `text` quoted and escaped. Throws std::invalid_argument where check_string does, after
-    /// writing part of the string.
+    /// `text` quoted and escaped. Throws std::invalid_argument, after writing part of the
+    /// string, when the text must be ASCII and `text` is not well-formed UTF-8.
     void string(const std::string& text) { quoted(text, 0); }
     /// The same for text of which nothing past its end may be read.
     void string(std::string_view text) { quoted_in_bounds(text, 0); }
     /// A member name as string() writes it, and its colon.
     void member_name(const std::string& name) { quoted(name, colon_size); }
     void member_name(std::string_view name) { quoted_in_bounds(name, colon_size); }
-    /// Throws std::invalid_argument, naming the offset of the first offending byte, when the
-    /// text must be ASCII and `text` is not well-formed UTF-8, so cannot be written. Linear.
-    void check_string(std::string_view text) const {
-        if (escapes == Escapes::slash_and_high || escapes == Escapes::high) {
-            check_utf8(text);
-        }
+    /// Whether the text must be ASCII, so that a string that is not well-formed UTF-8 cannot
+    /// be written.
+    bool ascii_only() const {
+        return escapes == Escapes::slash_and_high || escapes == Escapes::high;
     }
 
     /// The opening bracket of a container: '[' or '{'.
@@ -151,8 +153,6 @@ class TextLayout {
     template <typename Write>
     void with_escapes(Write&& write);
 
-    static void check_utf8(std::string_view text);
-
     // quoted()'s general case: a string of any length, its escapes written out.
     template <bool EscapeSlash, bool EscapeHigh>
     void escaped(std::string_view text, std::size_t colon_count);
@@ -168,6 +168,7 @@ class TextLayout {
     Escapes escapes;
     char colon[2];
     std::size_t colon_size;
+    bool reject_non_finite;
 };
 
 } // namespace json::detail

@@ -4,8 +4,11 @@
 #include "write_visitor.hpp"
 
 #include <json/detail/byte_scan.hpp>
+#include <json/detail/utf8.hpp>
+#include <json/pointer.hpp>
 
 #include <stdexcept>
+#include <string>
 #include <vector>
 
 namespace json {
@@ -57,9 +60,28 @@ bool is_json_number(std::string_view text) {
 class Writer::State {
   public:
     State(std::string& text, const WriteOptions& options)
-        : buffer(text), layout(buffer, options), stream(nullptr) {}
+        : buffer(text), layout(buffer, options), text(&text), text_size_before(text.size()),
+          stream(nullptr), check_utf8(checks_utf8(options)) {}
     State(std::ostream& out, const WriteOptions& options)
-        : buffer(out, detail::StreamText::plain), layout(buffer, options), stream(&out) {}
+        : buffer(out, detail::StreamText::plain), layout(buffer, options), text(nullptr),
+          stream(&out), check_utf8(checks_utf8(options)) {}
+
+    // Checks that `utf8`, a string or member name, can be written: well-formed UTF-8 unless
+    // the options let anything through. `place` says where it is, for a message.
+    void check_string(std::string_view utf8, const std::string& place = "a string") const {
+        const std::size_t offset = check_utf8 ? detail::ill_formed_offset(utf8) : std::string::npos;
+        if (offset != std::string::npos) {
+            throw std::invalid_argument(
+                "json: byte " + std::to_string(offset) + " of " + place +
+                " is not well-formed UTF-8" +
+                (layout.ascii_only() ? ", which ASCII-only text cannot write"
+                                     : " (WriteOptions::allow_invalid_utf8 writes it as it is)"));
+        }
+    }
+
+    // Checks every string, member name and number in `document` as the events for them would
+    // be checked, before any of it is written.
+    void check_document(const Value& document) const;
 
     // Checks that a value may come now.
     void expect_value() const {
@@ -113,6 +135,7 @@ class Writer::State {
 
     // What goes before a value: in an array, its separator and line.
     void start_value() {
+        began = true;
         if (!open.empty() && !open.back().is_object) {
             start_entry();
         }
@@ -158,7 +181,17 @@ class Writer::State {
         }
     }
 
-    void hand_on() { buffer.flush(); }
+    // When the Writer goes: a complete document is handed on; an incomplete one is taken back
+    // from a string, and a stream is told (failbit) and given no more of it.
+    void finish() {
+        if (finished || !began) {
+            buffer.flush();
+        } else if (text != nullptr) {
+            text->resize(text_size_before);
+        } else {
+            stream->setstate(std::ios::failbit); // throws if the caller enabled it: swallowed
+        }
+    }
 
     detail::OutputBuffer buffer;
     detail::TextLayout layout;
@@ -181,12 +214,80 @@ class Writer::State {
         top.empty = false;
     }
 
-    std::ostream* stream;
+    static bool checks_utf8(const WriteOptions& options) {
+        return options.ascii_only || !options.allow_invalid_utf8;
+    }
+
+    std::string* text;            // the string written to, or null
+    std::size_t text_size_before; // its size when the Writer was made
+    std::ostream* stream;         // the stream written to, or null
+    bool check_utf8;
     std::vector<Frame> open; // innermost last
     bool member_value_due = false;
+    bool began = false; // some of the top-level value is written
     bool finished = false;
     bool failed = false;
 };
+
+// The walk keeps the containers it is in, so that a refusal can name its place as a JSON
+// Pointer; iterative, so that the call stack stays flat whatever the depth.
+void Writer::State::check_document(const Value& document) const {
+    struct Open {
+        const Value* container;
+        std::size_t next_index;             // in an Array: the next element to check
+        Object::const_iterator next_member; // in an Object: the next member to check
+    };
+    std::vector<Open> open_containers;
+    Pointer place;
+    const auto here = [&place](const char* what) {
+        return place.empty() ? std::string(what)
+                             : std::string(what) + " at \"" + place.text() + "\"";
+    };
+    const auto check_value = [&](const Value& value) {
+        if (value.is_string()) {
+            check_string(value.as_string(), here("the string"));
+        } else if (value.is_number()) {
+            try {
+                layout.check_finite(value.as_number());
+            } catch (const std::invalid_argument& error) {
+                throw std::invalid_argument(std::string(error.what()) + " (" + here("the number") +
+                                            ")");
+            }
+        } else if (value.is_array() || value.is_object()) {
+            open_containers.push_back(
+                {&value, 0,
+                 value.is_object() ? value.as_object().begin() : Object::const_iterator()});
+            return;
+        }
+        if (!open_containers.empty()) {
+            place.pop_back();
+        }
+    };
+    check_value(document);
+    while (!open_containers.empty()) {
+        Open& top = open_containers.back();
+        const Value& container = *top.container;
+        const bool done = container.is_array() ? top.next_index == container.as_array().size()
+                                               : top.next_member == container.as_object().end();
+        if (done) {
+            open_containers.pop_back();
+            if (!open_containers.empty()) {
+                place.pop_back();
+            }
+            continue;
+        }
+        if (container.is_array()) {
+            const std::size_t index = top.next_index++;
+            place.push_back(index);
+            check_value(container.as_array()[index]);
+        } else {
+            const auto& [name, member] = *top.next_member++;
+            place.push_back(name);
+            check_string(name, here("the member name"));
+            check_value(member);
+        }
+    }
+}
 
 Writer::Writer(std::string& text, const WriteOptions& options)
     : state(std::make_unique<State>(text, options)) {}
@@ -196,7 +297,7 @@ Writer::Writer(std::ostream& out, const WriteOptions& options)
 
 Writer::~Writer() {
     try {
-        state->hand_on();
+        state->finish();
     } catch (...) { // NOLINT(bugprone-empty-catch): a destructor cannot report it
     }
 }
@@ -234,6 +335,7 @@ bool Writer::number(std::string_view literal) {
 
 bool Writer::number(double value) {
     state->expect_value();
+    state->layout.check_finite(value);
     return state->write([this, value] {
         state->start_value();
         state->layout.number(value);
@@ -243,7 +345,7 @@ bool Writer::number(double value) {
 
 bool Writer::string(std::string_view utf8) {
     state->expect_value();
-    state->layout.check_string(utf8);
+    state->check_string(utf8);
     return state->write([this, utf8] {
         state->start_value();
         state->layout.string(utf8);
@@ -253,7 +355,7 @@ bool Writer::string(std::string_view utf8) {
 
 bool Writer::key(std::string_view utf8) {
     state->expect_key();
-    state->layout.check_string(utf8);
+    state->check_string(utf8, "a member name");
     return state->write([this, utf8] { state->key(utf8); });
 }
 
@@ -288,6 +390,7 @@ bool Writer::value(const Value& document) {
             return true; // no text, and the top-level value still to come
         }
     }
+    state->check_document(document);
     return state->write([this, &document] {
         state->start_value();
         if (document.which() == detail::UNDEFINED_INDEX) {

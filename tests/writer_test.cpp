@@ -1,5 +1,7 @@
 #include <json/json.hpp>
 
+#include "support/errors.hpp"
+
 #include <gtest/gtest.h>
 
 #include <cmath>
@@ -11,6 +13,11 @@
 namespace {
 
 using namespace json;
+
+// More text than a Writer onto a stream gathers before it hands it on.
+constexpr std::size_t detail_buffer_size() {
+    return std::size_t{64} * 1024;
+}
 
 // Hands a Writer the events of a walk over `value`: members in key order, members holding
 // Undefined left out, Undefined elements as null, doubles as number(double).
@@ -162,6 +169,8 @@ TEST(Writer, MisuseWritesNothing) {
     const Call nothing = [](Writer&) {};
     WriteOptions ascii;
     ascii.ascii_only = true;
+    WriteOptions numbers_only;
+    numbers_only.reject_non_finite = true;
     const struct {
         Call before, misuse;
         bool logic; // std::logic_error, else std::invalid_argument
@@ -185,6 +194,30 @@ TEST(Writer, MisuseWritesNothing) {
         {named, [](Writer& w) { w.value(Undefined()); }, false},
         {open_array, [](Writer& w) { w.string("\xC3"); }, false, ascii},
         {open_object, [](Writer& w) { w.key("a\x80"); }, false, ascii},
+        {open_array, [](Writer& w) { w.string("ok \xED\xA0\x80"); }, false},
+        {open_object, [](Writer& w) { w.key("\xF4\x90\x80\x80"); }, false},
+        {nothing,
+         [](Writer& w) {
+             w.value(Object{{"a", Array{1, "x\xC3"}}});
+         },
+         false},
+        {nothing,
+         [](Writer& w) {
+             w.value(Object{{"a\xFF", 1}});
+         },
+         false},
+        {open_array,
+         [](Writer& w) {
+             w.value(Array{"x", Array{"\xC0\x80"}});
+         },
+         false},
+        {open_array, [](Writer& w) { w.number(std::nan("")); }, false, numbers_only},
+        {open_array,
+         [](Writer& w) {
+             w.value(Array{1, -HUGE_VAL});
+         },
+         false, numbers_only},
+        {open_array, [](Writer& w) { w.value(HUGE_VALF); }, false, numbers_only},
         {nothing, [](Writer& w) { w.number(""); }, false},
         {open_array, [](Writer& w) { w.number("01"); }, false},
         {open_array, [](Writer& w) { w.number("1."); }, false},
@@ -222,16 +255,95 @@ TEST(Writer, MisuseWritesNothing) {
     EXPECT_EQ(text, R"({"k":1.5})");
 }
 
+// A refusal names the byte and its place in a document; what is refused by default goes
+// through when the caller asks for it by name.
+TEST(Writer, RefusalsAndWhatTheOptionsLetThrough) {
+    std::string text;
+    Writer strict(text);
+    EXPECT_EQ(test_support::error_of([&] {
+                  strict.value(Object{{"a", Array{1, "x\xC3"}}});
+              }),
+              "invalid: json: byte 1 of the string at \"/a/1\" is not well-formed UTF-8 "
+              "(WriteOptions::allow_invalid_utf8 writes it as it is)");
+    WriteOptions lenient;
+    lenient.allow_invalid_utf8 = true;
+    lenient.reject_non_finite = true;
+    Writer writer(text, lenient);
+    writer.begin_object();
+    writer.key("\xFF");
+    EXPECT_EQ(test_support::error_of([&] {
+                  writer.value(Array{1, NAN});
+              }),
+              "invalid: json: NaN has no JSON number, and WriteOptions::reject_non_finite refuses "
+              "to write it as a string (the number at \"/1\")");
+    writer.value(Array{"x\xC3", 1.5});
+    writer.end_object();
+    EXPECT_EQ(text, "{\"\xFF\":[\"x\xC3\",1.5]}");
+    EXPECT_EQ(json::validate(text).refusal, json::Refusal::INVALID_UTF8); // as the option warns
+}
+
+// Fails on its first write, when its caller enabled exceptions.
+class FailingBuffer : public std::streambuf {
+  protected:
+    int_type overflow(int_type) override { throw std::runtime_error("disk gone"); }
+    std::streamsize xsputn(const char*, std::streamsize) override {
+        throw std::runtime_error("disk gone");
+    }
+};
+
 // A write that fails part-way leaves the Writer unusable.
 TEST(Writer, FailedWriteLeavesItUnusable) {
-    WriteOptions ascii;
-    ascii.ascii_only = true;
-    std::string text;
-    Writer writer(text, ascii);
+    FailingBuffer failing;
+    std::ostream out(&failing);
+    out.exceptions(std::ios::badbit);
+    Writer writer(out);
     writer.begin_array();
-    EXPECT_THROW(writer.value(Array{"ok", "\xFF"}), std::invalid_argument);
+    EXPECT_THROW(writer.string(std::string(detail_buffer_size(), 'x')), std::runtime_error);
     EXPECT_THROW(writer.end_array(), std::logic_error);
     EXPECT_THROW(writer.null(), std::logic_error);
+}
+
+// A Writer that goes before its document is complete hands on none of it: a string is cut
+// back to what it held before, however much was written into it; a stream gets nothing more
+// and failbit, without an exception from the destructor.
+TEST(Writer, AnIncompleteDocumentIsNotHandedOn) {
+    using Events = std::function<void(Writer&)>;
+    const Events truncated = [](Writer& w) {
+        w.begin_array();
+        w.begin_object();
+        w.key("k");
+    };
+    const Events long_and_truncated = [](Writer& w) {
+        w.begin_array();
+        for (int i = 0; i < 1000; ++i) {
+            w.string(std::string(100, 'x'));
+        }
+    };
+    const Events flushed_and_truncated = [](Writer& w) {
+        w.begin_array();
+        w.null();
+        w.flush();
+    };
+    for (const Events& events : {truncated, long_and_truncated, flushed_and_truncated}) {
+        std::string text = "before";
+        {
+            Writer writer(text);
+            events(writer);
+        }
+        EXPECT_EQ(text, "before");
+        std::ostringstream out;
+        out.exceptions(std::ios::failbit);
+        {
+            Writer writer(out);
+            events(writer);
+        }
+        EXPECT_TRUE(out.fail());
+        EXPECT_LT(out.str().size(), 100'000u); // what went out when the buffer filled
+    }
+    // Nothing begun is nothing cut short.
+    std::ostringstream untouched;
+    { Writer writer(untouched); }
+    EXPECT_TRUE(untouched.good());
 }
 
 // Keeps what it is given and counts flushes.
@@ -268,14 +380,6 @@ TEST(Writer, OntoAStream) {
         writer.flush();
         EXPECT_EQ(buffer.syncs, 2);
     }
-    // What is left when the Writer goes is handed on.
-    buffer.str("");
-    {
-        Writer writer(out);
-        writer.begin_object();
-        writer.key("k");
-    }
-    EXPECT_EQ(buffer.str(), R"({"k":)");
 }
 
 } // namespace

@@ -33,6 +33,15 @@ struct WriteOptions {
     /// In pretty text, an empty array or object at level L holds the indentation of level L
     /// (`[    ]` one level down); when false, every empty container is `[]` or `{}`.
     bool pad_empty_containers = true;
+    /// json::Writer only: write strings and member names that are not well-formed UTF-8 as
+    /// they are, which no strict reader accepts. When false, the Writer refuses them
+    /// (std::invalid_argument). json::serialize and json::write never check: they write a
+    /// document's strings as they are held (but for ascii_only, which cannot write them).
+    bool allow_invalid_utf8 = false;
+    /// Refuse NaN and the infinities (std::invalid_argument), which have no JSON number,
+    /// instead of writing them as the strings "NaN", "Inf" and "-Inf": a number then never
+    /// comes back as a string. For every writer given these options.
+    bool reject_non_finite = false;
 };
 
 /// The pretty layout most JSON tools write: two spaces per level, `"a": 1`, `[]` and `{}` for

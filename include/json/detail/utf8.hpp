@@ -9,6 +9,7 @@
 #include <json/detail/byte_scan.hpp>
 
 #include <cstddef>
+#include <string_view>
 
 namespace json::detail {
 
@@ -105,6 +106,23 @@ inline const char* find_special_or_ill_formed(const char* from, const char* end)
             return from;
         }
     }
+}
+
+/// The offset in `text` of the first byte that is not part of a well-formed UTF-8 sequence, or
+/// std::string_view::npos when it is all well-formed. Linear. Throws nothing.
+inline std::size_t ill_formed_offset(std::string_view text) noexcept {
+    const char* const end = text.data() + text.size();
+    for (const char* at = text.data(); at != end; ++at) {
+        // Stops at a byte a string escapes, which is well-formed, or at an ill-formed one.
+        at = find_special_or_ill_formed<false>(at, end);
+        if (at == end) {
+            break;
+        }
+        if (static_cast<unsigned char>(*at) >= 0x80) {
+            return static_cast<std::size_t>(at - text.data());
+        }
+    }
+    return std::string_view::npos;
 }
 
 } // namespace json::detail
