@@ -8,6 +8,7 @@
 #include <cstddef>
 #include <streambuf>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace jsonfmt {
@@ -16,18 +17,30 @@ namespace jsonfmt {
 /// and closes) in pieces of up to 64 KiB, with one read(2) each, so that text from a pipe is
 /// taken as it comes. The piece before the current one is kept too: a parser reading through
 /// the buffer fails within the last bytes it took, and kept() gives them back for the message.
-/// A failing read ends the text as the end of the file does; error() tells them apart.
+///
+/// Only the end of the file ends the text. A read interrupted by a signal is made again, one
+/// on a descriptor in non-blocking mode that has nothing yet waits for input (poll(2)), and
+/// any other failure throws std::system_error, so that a reader never takes the text read
+/// so far for the whole of it; read_error() keeps the errno.
 class DescriptorInput : public std::streambuf {
   public:
-    /// Reads `name`, or standard input for "-". When the file does not open, error() says why
-    /// and the text is empty.
+    /// Reads `name`, or standard input for "-". When the file does not open, open_error() says
+    /// why and the text is empty.
     explicit DescriptorInput(const std::string& name);
     ~DescriptorInput() override;
     DescriptorInput(const DescriptorInput&) = delete;
     DescriptorInput& operator=(const DescriptorInput&) = delete;
 
-    /// The errno of the failed open or read, or 0.
-    int error() const { return failure; }
+    /// The errno of a failed open, or 0.
+    int open_error() const { return open_failure; }
+    /// The errno of a failed read, or 0.
+    int read_error() const { return read_failure; }
+
+    /// The bytes read and not yet taken, read first when there are none; empty at the end of
+    /// the file. Throws std::system_error when the read fails.
+    std::string_view peek();
+    /// Takes `count` bytes of those peek() gave.
+    void take(std::size_t count) { gbump(static_cast<int>(count)); }
 
     /// The bytes from offset `from` up to `to` (counted from the start of the text) that are
     /// still kept, and the offset of the first of them: a part of the range when its start
@@ -46,7 +59,8 @@ class DescriptorInput : public std::streambuf {
 
     int descriptor;
     bool owned;
-    int failure = 0;
+    int open_failure = 0;
+    int read_failure = 0;
     std::array<std::vector<char>, 2> pieces; // the current one and the one before, alternating
     std::size_t current = 0;                 // which of them is the current one
     std::size_t current_start = 0;           // the offset of its first byte in the text

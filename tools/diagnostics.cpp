@@ -27,6 +27,10 @@ std::string with_flag_names(std::string note) {
 
 } // namespace
 
+void complain(const std::string& message) {
+    std::fprintf(stderr, "jsonfmt: %s\n", message.c_str());
+}
+
 // A refusal of bad UTF-8 or of an unpaired surrogate is said by its note alone: the grammar's
 // code that comes with it only approximates the reason. The surrogate is valid JSON, which
 // only a change (to U+FFFD) could write.

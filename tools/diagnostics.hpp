@@ -1,7 +1,7 @@
 #ifndef JSONFMT_DIAGNOSTICS_HPP
 #define JSONFMT_DIAGNOSTICS_HPP
 
-// How jsonfmt words a failed parse and shows where it failed.
+// How jsonfmt says what went wrong: its messages, and where a parse failed.
 
 #include <json/parse.hpp>
 
@@ -14,6 +14,9 @@ namespace jsonfmt {
 /// How much of the failing line is shown before and after the failing byte.
 constexpr std::size_t SHOWN_BEFORE = 60;
 constexpr std::size_t SHOWN_AFTER = 20;
+
+/// Writes "jsonfmt: MESSAGE" on standard error.
+void complain(const std::string& message);
 
 /// What a failed parse is reported as, with jsonfmt's flags in place of the library's options.
 std::string failure_message(const json::ParseReport& report);
