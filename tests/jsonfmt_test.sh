@@ -1,11 +1,16 @@
 #!/usr/bin/env bash
 # Checks jsonfmt's output, its error messages, its exit codes and the files it writes.
-# Usage: jsonfmt_test.sh JSONFMT [sanitized|plain]
+# Usage: jsonfmt_test.sh JSONFMT sanitized|plain FAILING_READ FEED_IN_PIECES CONFORMANCE_DIR
 # "sanitized" skips the cases under ulimit -v: AddressSanitizer reserves terabytes of address
-# space, which no `ulimit -v` admits.
+# space, which no `ulimit -v` admits. FAILING_READ is a library for LD_PRELOAD that makes
+# read(2) fail after $FAILING_READ_AFTER bytes; FEED_IN_PIECES runs a command on a non-blocking
+# pipe fed in pieces; CONFORMANCE_DIR holds the parsing test suite.
 set -uo pipefail
 jsonfmt=$1
-mode=${2:-plain}
+mode=$2
+failing_read=$3
+feed_in_pieces=$4
+conformance=$5
 here=$(cd "$(dirname "$0")" && pwd)
 work=$(mktemp -d)
 trap 'chmod -R u+w "$work"; rm -rf "$work"' EXIT
@@ -403,6 +408,55 @@ printf '[1,\0 2 x]\n' >"$work/nul.json"
 "$jsonfmt" "$work/nul.json" >"$work/out" 2>"$work/err"
 check nul-status [ $? = 1 ]
 check nul-context cmp "$work/nul.expected" "$work/err"
+
+# A read that fails is an I/O error, never the end of the text: the document is refused and
+# the files stay as they were
+printf '12345678' >"$work/num.json"
+cp "$work/num.json" "$work/num-in-place.json"
+printf 'old' >"$work/kept.json"
+printf '[1]\n[2]\n[3]\n' >"$work/three.jsonl"
+breaking=(env LD_PRELOAD="$failing_read" ASAN_OPTIONS=verify_asan_link_order=0 FAILING_READ_AFTER=4)
+eio="read failed: Input/output error"
+expect read-error 2 "" "jsonfmt: $work/num.json: $eio" "${breaking[@]}" -- "$work/num.json"
+expect read-error-in-place 2 "" "jsonfmt: $work/num-in-place.json: $eio" "${breaking[@]}" -- -i "$work/num-in-place.json"
+check read-error-in-place-kept [ "$(cat "$work/num-in-place.json")" = 12345678 ]
+expect read-error-output 2 "" "jsonfmt: $work/num.json: $eio" "${breaking[@]}" -- -o "$work/kept.json" "$work/num.json"
+check read-error-output-kept [ "$(cat "$work/kept.json")" = old ]
+expect read-error-lines 2 "[1]" "jsonfmt: $work/three.jsonl:2: $eio" "${breaking[@]}" -- -l "$work/three.jsonl"
+# A non-blocking pipe that has nothing yet is waited on, not taken for the end of the text
+expect non-blocking-pipe 0 "1234" "" "$feed_in_pieces" 200 '12|34' -- -c
+expect non-blocking-pipe-invalid 1 "" "<stdin>:1:7: $(printf '%s' "$no_digit" | sed 's/no JSON value starts here/the text goes on after the JSON value/; s/Expected leading digit while parsing value of type number/Unexpected end of input/')
+[1,2] x
+      ^" "$feed_in_pieces" 200 '[1,2]| x' -- -c
+
+# --check gives every document the verdict of the run it stands for, message for message
+for flags in "" "--ascii --lossy" "--ascii" "--lossy" "--pointer /0" "--sort-keys" "-l" \
+    "--allow-comments --allow-trailing-commas --allow-bom" "--max-depth 2"; do
+    "$jsonfmt" $flags "$conformance"/* >/dev/null 2>"$work/run.err"
+    run_status=$?
+    "$jsonfmt" --check $flags "$conformance"/* >"$work/check.out" 2>"$work/check.err"
+    check_status=$?
+    check "check-agrees: ${flags:-no flags}" bash -c '[ "$0" = "$1" ] && cmp -s "$2" "$3" && [ ! -s "$4" ]' \
+        "$run_status" "$check_status" "$work/run.err" "$work/check.err" "$work/check.out"
+done
+
+# A byte order mark, lines ended by carriage returns, a depth beyond counting
+printf '\xef\xbb\xbf{"a": 1}' >"$work/bom.json"
+cp "$work/bom.json" "$work/bom-in-place.json"
+expect bom-refused 1 "" "$work/bom.json:1:1: error: Expected leading digit while parsing value of type number (a UTF-8 byte order mark (EF BB BF) is not JSON; --allow-bom skips it)
+$(printf '\xef\xbb\xbf{"a": 1}')
+^" -- "$work/bom.json"
+expect bom-allowed 0 '{"a":1}' "" -- -c --allow-bom "$work/bom.json"
+expect bom-in-place-kept 1 "" "$work/bom-in-place.json:1:1: error: --in-place would drop the byte order mark (add --lossy to allow that)
+$(printf '\xef\xbb\xbf{"a": 1}')
+^" -- -i --allow-bom "$work/bom-in-place.json"
+expect bom-in-place-dropped 0 "" "" -- -i -c --allow-bom --lossy "$work/bom-in-place.json"
+check bom-in-place-content [ "$(cat "$work/bom-in-place.json")" = '{"a":1}' ]
+printf '[1,\r2,\rx]\r[3]' >"$work/returns.json"
+expect carriage-returns 1 "" "$work/returns.json:3:1: $no_digit
+x]
+^" -- "$work/returns.json"
+expect depth-beyond-counting 2 "" "jsonfmt: --max-depth: 99999999999999999999999 is more than the largest depth allowed, 18446744073709551615 (try --help)" -- --max-depth 99999999999999999999999
 
 # Bounded memory: a 1 MB document nested 500 deep pretty-prints to 1.3 GB within 300 MB of
 # address space, the output streaming out as it is made

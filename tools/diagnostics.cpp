@@ -16,6 +16,7 @@ std::string with_flag_names(std::string note) {
         {"the allow_trailing_commas option", "--allow-trailing-commas"},
         {"the allow_invalid_utf8 option", "--lossy"},
         {"the allow_lone_surrogates option", "--lossy"},
+        {"ParseOptions::allow_bom", "--allow-bom"},
     };
     for (const auto& [option, flag] : OPTION_TO_FLAG) {
         if (const std::size_t at = note.find(option); at != std::string::npos) {
@@ -60,7 +61,7 @@ void show_failure_line(std::string_view text, std::size_t start, const json::Par
     } else {
         shown = "...";
     }
-    const std::size_t line_end = std::min(text.find('\n', failure), text.size());
+    const std::size_t line_end = std::min(text.find_first_of("\r\n", failure), text.size());
     const std::size_t to = std::min(line_end, failure + SHOWN_AFTER);
     std::string caret(shown.size(), ' ');
     for (std::size_t i = from; i < failure; ++i) {
