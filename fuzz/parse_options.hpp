@@ -3,7 +3,7 @@
 #ifndef JSONVALUE_FUZZ_PARSE_OPTIONS_HPP
 #define JSONVALUE_FUZZ_PARSE_OPTIONS_HPP
 
-#include <json/parse.hpp>
+#include <json/parse_options.hpp>
 
 #include <cstddef>
 #include <cstdint>

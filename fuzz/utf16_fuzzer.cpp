@@ -1,7 +1,7 @@
 // Decodes arbitrary bytes as UTF-16 code units: the result must be the UTF-8 of the same
 // characters, a surrogate pair becoming one character and an unpaired surrogate U+FFFD. The
 // UTF-8 is read back by the C library's strict decoder of the C.UTF-8 locale.
-#include <json/parse.hpp>
+#include <json/text_conversion.hpp>
 
 #include <clocale>
 #include <cstddef>

@@ -1,11 +1,10 @@
 #include "messages.hpp"
+#include "number.hpp"
 
 #include <json/convert.hpp>
 #include <json/pointer.hpp>
 #include <json/serializer.hpp>
 
-#include <array>
-#include <charconv>
 #include <exception>
 #include <string>
 
@@ -13,11 +12,10 @@ namespace json::detail {
 
 namespace {
 
-// The shortest text that reads back as `number`.
+// The shortest text that reads back as `number`, as the writer writes it.
 std::string number_text(double number) {
-    std::array<char, 32> text{};
-    const auto result = std::to_chars(text.data(), text.data() + text.size(), number);
-    return std::string(text.data(), result.ptr);
+    char text[NUMBER_TEXT_SIZE];
+    return std::string(text, write_number(text, number));
 }
 
 // `message` with "/token" in front of its pointer; a message without a pointer (a failure at

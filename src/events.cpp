@@ -1,3 +1,6 @@
+#include "document_checks.hpp"
+#include "number.hpp"
+
 #include <json/events.hpp>
 
 #include <algorithm>
@@ -63,7 +66,8 @@ class Validator {
     // The literal is NUL-terminated (the grammar's copy).
     bool number(std::string_view literal) {
         double value = 0.0;
-        return !options.exact_numbers || read_exactly(literal, value) || refusal.inexact(literal);
+        return !options.exact_numbers || read_number_exactly(literal, value) ||
+               refusal.inexact(literal);
     }
     bool string(std::string_view) { return true; }
     bool key(std::string_view name) {
@@ -130,25 +134,13 @@ bool StreamPieces::append(std::string& text, std::size_t count) {
 ParseReport validate(std::string_view text, const ParseOptions& options) {
     detail::Validator validator(options);
     detail::Workspace workspace;
-    detail::Grammar<detail::Validator> grammar(validator, options, workspace);
-    const ParseResult result = grammar.feed(text.data(), text.data() + text.size(), true);
-    if (result == ParseResult::SUCCESS) {
-        return ParseReport();
-    }
-    ParseReport report = detail::failure_report(result, grammar, detail::TextPosition(), text);
-    validator.explain(report);
-    return report;
+    return detail::run_parser(validator, options, workspace, text);
 }
 
 ParseReport validate(std::istream& in, const ParseOptions& options) {
     detail::Validator validator(options);
     detail::Workspace workspace;
-    detail::Grammar<detail::Validator> grammar(validator, options, workspace);
-    detail::TextPosition position;
-    std::string rest;
-    ParseReport report = detail::feed_stream(in, grammar, position, rest);
-    validator.explain(report);
-    return report;
+    return detail::run_parser(validator, options, workspace, in);
 }
 
 } // namespace json

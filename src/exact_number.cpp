@@ -1,12 +1,13 @@
 // Whether a number's text survives a read into a double and the writer's text of that double
 // as the same decimal number.
-#include <json/detail/byte_scan.hpp>
-#include <json/parse.hpp>
+#include "number.hpp"
 
-#include <number_text.hpp>
+#include <json/detail/byte_scan.hpp>
+#include <json/text_conversion.hpp>
 
 #include <algorithm>
 #include <array>
+#include <cfloat>
 #include <cmath>
 #include <cstdint>
 #include <cstring>
@@ -280,15 +281,27 @@ bool written_back_exactly(const std::optional<Significand>& significand, std::st
             break;
         }
     }
-    constexpr std::size_t size = 80;
-    char written[size] = {};
-    getDoubleValueStr(written, value);
-    return same_decimal(take_apart(literal), take_apart(written));
+    char written[NUMBER_TEXT_SIZE];
+    const char* const end = write_number(written, value);
+    return same_decimal(
+        take_apart(literal),
+        take_apart(std::string_view(written, static_cast<std::size_t>(end - written))));
 }
 
 } // namespace
 
+// Up to fifteen significant digits (the literal has at least as many characters) come back
+// unchanged from a normal double (DBL_DIG), and the writer writes every double below 2^53 with
+// its shortest digits: those need no check. Anything else is read and checked in one pass.
 bool read_number_exactly(std::string_view literal, double& value) noexcept {
+    if (literal.size() <= DBL_DIG) {
+        constexpr double exact_integers = 9007199254740992.0; // 2^53
+        value = read_number(literal);
+        const double magnitude = std::fabs(value);
+        if (magnitude >= DBL_MIN && magnitude <= exact_integers) {
+            return true;
+        }
+    }
     const std::optional<Significand> significand = read_significand(literal);
     const std::optional<double> direct =
         significand ? scaled_exactly(significand->digits, significand->last_exponent)

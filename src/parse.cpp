@@ -1,12 +1,11 @@
-#include <json/events.hpp>
+// The outcome codes' descriptions, and parsing into a document.
+#include "document_builder.hpp"
+
+#include <json/detail/run_parser.hpp>
 #include <json/parse.hpp>
 
-#include <codecvt_ustring_to_string.hpp>
-#include <number_text.hpp>
-
 #include <istream>
-#include <stdexcept>
-#include <string>
+#include <string_view>
 
 namespace json {
 
@@ -45,41 +44,22 @@ const char* get_parse_result_description(ParseResult result) {
     return code >= 0 && code < CODE_COUNT ? DESCRIPTIONS[code] : "Unrecognized error code";
 }
 
-namespace detail {
-
-double string_to_double(const char* text) {
-    return convertStrToDouble(text);
-}
-
-std::string u16_to_u8(char16_t* text, int count) {
-    const std::string encoding = "UTF-8";
-    const codecvt_ustring_to_string converter(encoding, true);
-    // libstdc++ words this case differently and would check the size first: test it here.
-    if (text == nullptr && count != 0) {
-        throw std::logic_error("basic_string::_M_construct null not valid");
+ParseReport parse(std::string_view text, Value& out, const ParseOptions& options) {
+    detail::Workspace workspace;
+    detail::DocumentBuilder builder(options, workspace);
+    ParseReport report = detail::run_parser(builder, options, workspace, text);
+    if (report) {
+        builder.take(out);
     }
-    // A negative count, widened with its sign, exceeds max_size(): std::length_error.
-    const std::u16string units =
-        count == 0 ? std::u16string() : std::u16string(text, static_cast<std::size_t>(count));
-    if (units.empty()) {
-        return std::string();
-    }
-    return converter.do_convert(units.data(), units.size());
+    return report;
 }
-
-} // namespace detail
 
 ParseReport parse(std::istream& in, Value& out, const ParseOptions& options) {
     detail::Workspace workspace;
     detail::DocumentBuilder builder(options, workspace);
-    detail::Grammar<detail::DocumentBuilder> grammar(builder, options, workspace);
-    detail::TextPosition position;
-    std::string rest;
-    ParseReport report = detail::feed_stream(in, grammar, position, rest);
+    ParseReport report = detail::run_parser(builder, options, workspace, in);
     if (report) {
         builder.take(out);
-    } else {
-        builder.explain(report);
     }
     return report;
 }

@@ -1,7 +1,8 @@
 #include "text_layout.hpp"
 
+#include "number.hpp"
+
 #include <json/detail/utf8.hpp>
-#include <number_text.hpp>
 
 #include <array>
 #include <cmath>
@@ -39,19 +40,6 @@ constexpr std::array<char, 256> ESCAPES = make_escape_table();
     throw std::invalid_argument("json: byte " + std::to_string(offset) +
                                 " of a string is not well-formed UTF-8, which ASCII-only text "
                                 "cannot write");
-}
-
-// The length of the NUL-terminated text in a number buffer of `size` bytes, read one byte at a
-// time on purpose: the text was stored a byte or two at a time an instant ago, and a wider load
-// over those stores cannot be served from the store buffer and waits for them to reach the
-// cache, which costs more than the few byte loads of a number's text.
-template <std::size_t size>
-std::size_t text_length(const char* text) {
-    std::size_t length = 0;
-    while (length != size && text[length] != '\0') {
-        ++length;
-    }
-    return length;
 }
 
 #if defined(__SSE2__)
@@ -226,15 +214,13 @@ template void TextLayout::escaped<false, false>(std::string_view, std::size_t);
 template void TextLayout::escaped<false, true>(std::string_view, std::size_t);
 
 void TextLayout::number(double number) {
-    formatted_number(number, getDoubleValueStr);
+    formatted_number(number);
 }
 
 void TextLayout::number(float number) {
-    formatted_number(number, getFloatValueStr);
+    formatted_number(number);
 }
 
-// NaN and the infinities are written as strings; every finite number is formatted by the
-// number-text library straight into 80 zeroed bytes of the buffer, then kept up to its NUL.
 void TextLayout::check_finite(double number) const {
     if (reject_non_finite && !std::isfinite(number)) {
         throw std::invalid_argument(std::string("json: ") +
@@ -246,8 +232,10 @@ void TextLayout::check_finite(double number) const {
     }
 }
 
+// NaN and the infinities are written as strings; every finite number's text is written
+// straight into the buffer.
 template <typename Number>
-void TextLayout::formatted_number(Number number, int (*format)(char*, Number)) {
+void TextLayout::formatted_number(Number number) {
     check_finite(number);
     if (std::isnan(number)) {
         buffer.append("\"NaN\"", 5);
@@ -256,11 +244,8 @@ void TextLayout::formatted_number(Number number, int (*format)(char*, Number)) {
     } else if (number < -std::numeric_limits<Number>::max()) {
         buffer.append("\"-Inf\"", 6);
     } else {
-        constexpr std::size_t size = 80;
-        char* const text = buffer.reserve(size);
-        std::memset(text, 0, size);
-        format(text, number);
-        buffer.commit(text + text_length<size>(text));
+        char* const text = buffer.reserve(NUMBER_TEXT_SIZE);
+        buffer.commit(write_number(text, number));
     }
 }
 

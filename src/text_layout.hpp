@@ -158,7 +158,7 @@ class TextLayout {
     void escaped(std::string_view text, std::size_t colon_count);
 
     template <typename Number>
-    void formatted_number(Number number, int (*format)(char*, Number));
+    void formatted_number(Number number);
 
     OutputBuffer& buffer;
     bool pretty;

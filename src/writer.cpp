@@ -3,7 +3,7 @@
 #include "text_layout.hpp"
 #include "write_visitor.hpp"
 
-#include <json/detail/byte_scan.hpp>
+#include <json/detail/number_syntax.hpp>
 #include <json/detail/utf8.hpp>
 #include <json/pointer.hpp>
 
@@ -12,47 +12,6 @@
 #include <vector>
 
 namespace json {
-
-namespace {
-
-// Whether `text` is a JSON number: -?(0|[1-9][0-9]*)(\.[0-9]+)?([eE][+-]?[0-9]+)?
-bool is_json_number(std::string_view text) {
-    const char* at = text.data();
-    const char* const end = at + text.size();
-    const auto next_is = [&](char c) { return at != end && *at == c; };
-    // Skips one or more digits; false when there is none.
-    const auto skip_digits = [&] {
-        const char* const from = at;
-        at = detail::skip_digits(at, end);
-        return at != from;
-    };
-    if (next_is('-')) {
-        ++at;
-    }
-    if (next_is('0')) {
-        ++at;
-    } else if (!skip_digits()) {
-        return false;
-    }
-    if (next_is('.')) {
-        ++at;
-        if (!skip_digits()) {
-            return false;
-        }
-    }
-    if (next_is('e') || next_is('E')) {
-        ++at;
-        if (next_is('+') || next_is('-')) {
-            ++at;
-        }
-        if (!skip_digits()) {
-            return false;
-        }
-    }
-    return at == end;
-}
-
-} // namespace
 
 // The open containers and what each event may do next. Each event checks first that it may
 // come (throwing before it writes anything), then writes; an exception while writing leaves
@@ -322,7 +281,9 @@ bool Writer::boolean(bool value) {
 
 bool Writer::number(std::string_view literal) {
     state->expect_value();
-    if (!is_json_number(literal)) {
+    const detail::NumberScan scan =
+        detail::scan_number(literal.data(), literal.data() + literal.size());
+    if (scan.error != ParseResult::SUCCESS || scan.end != literal.data() + literal.size()) {
         throw std::invalid_argument("json::Writer: not a JSON number: \"" + std::string(literal) +
                                     '"');
     }

@@ -1,6 +1,6 @@
 // Substitutes the text-encoding library: this executable defines the converter's exported
 // members itself, so libjsonvalue's calls land here and can be recorded.
-#include <json/parse.hpp>
+#include <json/text_conversion.hpp>
 
 #include <codecvt_ustring_to_string.hpp>
 

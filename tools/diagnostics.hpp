@@ -3,7 +3,7 @@
 
 // How jsonfmt says what went wrong: its messages, and where a parse failed.
 
-#include <json/parse.hpp>
+#include <json/parse_options.hpp>
 
 #include <cstddef>
 #include <string>

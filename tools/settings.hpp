@@ -3,7 +3,7 @@
 
 // What a jsonfmt run was asked to do, as its command line said it.
 
-#include <json/parse.hpp>
+#include <json/parse_options.hpp>
 #include <json/pointer.hpp>
 #include <json/serializer.hpp>
 

@@ -5,7 +5,8 @@
 // instead of building a document, from text or from a stream read in pieces; and validation.
 
 #include <json/detail/export.hpp>
-#include <json/parse.hpp>
+#include <json/detail/run_parser.hpp>
+#include <json/parse_options.hpp>
 
 #include <cstddef>
 #include <istream>
@@ -44,65 +45,6 @@ struct NoOpHandler {
     bool end_object() { return true; }             ///< Accepts an object's end.
 };
 
-namespace detail {
-
-/// Reads a std::istream in pieces for the grammar, as the standard input functions read:
-/// whitespace is not skipped, a stream that failed before anything was read is not readable,
-/// and a stream buffer that throws sets badbit (its own exception passes on when the caller
-/// enabled exceptions for badbit). Memory: only what it is asked to append.
-class JSONVALUE_API StreamPieces {
-  public:
-    explicit StreamPieces(std::istream& in);
-
-    /// Appends up to `count` bytes of the stream to `text`; false when none follows them (the
-    /// stream ended, or failed: failure() says so). Sets eofbit at the end of the stream.
-    /// Throws what the stream buffer throws when the caller enabled exceptions for badbit,
-    /// and std::bad_alloc.
-    bool append(std::string& text, std::size_t count);
-
-    /// Why the stream gave no more text although it did not end, or null.
-    const char* failure() const { return failure_note; }
-
-  private:
-    std::istream& in;
-    bool started = false;
-    const char* failure_note = nullptr;
-};
-
-/// Feeds `grammar` the text of `in` piece by piece and reports the outcome. Memory: the open
-/// containers, the longest token and one piece, never the whole text.
-template <typename Grammar>
-ParseReport feed_stream(std::istream& in, Grammar& grammar, TextPosition& position,
-                        std::string& rest) {
-    constexpr std::size_t piece = std::size_t{64} * 1024;
-    StreamPieces pieces(in);
-    std::size_t asked = piece;
-    for (;;) {
-        const bool more = pieces.append(rest, asked);
-        if (pieces.failure() != nullptr) {
-            ParseReport report;
-            report.result = ParseResult::UNEXPECTED_END_OF_INPUT;
-            report.note = pieces.failure();
-            position.locate(report, rest, position.offset + rest.size());
-            return report;
-        }
-        const ParseResult result = grammar.feed(rest.data(), rest.data() + rest.size(), !more);
-        if (result != Grammar::NEED_MORE) {
-            return result == ParseResult::SUCCESS ? ParseReport()
-                                                  : failure_report(result, grammar, position, rest);
-        }
-        // The rest of the piece is a token begun: it is read again with the next piece. A
-        // token that takes many pieces makes them grow, so that it is read again only as
-        // often as its length doubles.
-        const std::size_t consumed = grammar.consumed();
-        position.advance(std::string_view(rest).substr(0, consumed));
-        rest.erase(0, consumed);
-        asked = consumed == 0 ? asked + rest.size() : piece;
-    }
-}
-
-} // namespace detail
-
 /// Reads one JSON text with the grammar of json::parse and reports its tokens to `handler`
 /// in document order, building nothing. The options act as for json::parse, except the two
 /// that concern a document: member names are reported as they come, repeated or not
@@ -115,11 +57,7 @@ template <typename Handler>
 ParseReport parse_events(std::string_view text, Handler& handler,
                          const ParseOptions& options = {}) {
     detail::Workspace workspace;
-    detail::Grammar<Handler> grammar(handler, options, workspace);
-    const ParseResult result = grammar.feed(text.data(), text.data() + text.size(), true);
-    return result == ParseResult::SUCCESS
-               ? ParseReport()
-               : detail::failure_report(result, grammar, detail::TextPosition(), text);
+    return detail::run_parser(handler, options, workspace, text);
 }
 
 /// As above, reading the rest of `in` in pieces of 64 KiB: memory is bounded by the nesting
@@ -129,10 +67,7 @@ ParseReport parse_events(std::string_view text, Handler& handler,
 template <typename Handler>
 ParseReport parse_events(std::istream& in, Handler& handler, const ParseOptions& options = {}) {
     detail::Workspace workspace;
-    detail::Grammar<Handler> grammar(handler, options, workspace);
-    detail::TextPosition position;
-    std::string rest;
-    return detail::feed_stream(in, grammar, position, rest);
+    return detail::run_parser(handler, options, workspace, in);
 }
 
 /// The report json::parse would give for `text` with `options`, without building anything:

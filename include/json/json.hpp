@@ -7,8 +7,10 @@
 #include <json/convert.hpp>
 #include <json/events.hpp>
 #include <json/parse.hpp>
+#include <json/parse_options.hpp>
 #include <json/pointer.hpp>
 #include <json/serializer.hpp>
+#include <json/text_conversion.hpp>
 #include <json/value.hpp>
 #include <json/writer.hpp>
 

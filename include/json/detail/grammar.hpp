@@ -2,12 +2,15 @@
 #define JSON_DETAIL_GRAMMAR_HPP
 
 // The one JSON grammar behind every reader: json::parse (with the document builder as its
-// handler), json::validate and json::parse_events. Included by json/parse.hpp after the
-// declarations it uses. Header-level: a handler's calls are inlined into the token loop.
+// handler), json::validate and json::parse_events. Header-level, for parse_events: a
+// handler's calls are inlined into the token loop.
 
 #include <json/detail/byte_scan.hpp>
+#include <json/detail/number_syntax.hpp>
+#include <json/detail/utf16.hpp>
 #include <json/detail/utf8.hpp>
 #include <json/detail/workspace.hpp>
+#include <json/parse_options.hpp>
 
 #include <algorithm>
 #include <cstddef>
@@ -194,6 +197,7 @@ class Grammar {
     std::string decoded;         // reused for a string with escapes
     std::string long_number;     // reused for a number too long for the stack
     std::vector<char16_t> utf16; // reused for a run of \u escapes
+    Utf16Decoder decoder;        // converts them
 };
 
 template <typename Handler>
@@ -487,16 +491,13 @@ ParseResult Grammar<Handler>::unicode_escapes(std::string& text) {
             }
         }
     }
-    text += u16_to_u8(utf16.data(), static_cast<int>(utf16.size()));
+    decoder.append(text, utf16.data(), utf16.size());
     return ParseResult::SUCCESS;
 }
 
 template <typename Handler>
 inline ParseResult Grammar<Handler>::number() {
-    // Scanned with a local pointer, which the compiler keeps in a register (the member would
-    // be written back at every digit); `cursor` takes it at every exit.
     const char* const start = cursor;
-    const char* here = cursor;
     // The literal goes to the handler NUL-terminated: a short number is copied to the stack,
     // only a longer one goes through a reused string. Where the piece has them, its next 32
     // bytes are copied before the number is scanned (usually all of it), so that those stores
@@ -509,49 +510,18 @@ inline ParseResult Grammar<Handler>::number() {
     if (copy_ahead) {
         std::memcpy(text, start, copied_ahead);
     }
-    const auto digit_here = [&here, this] { return here != end && *here >= '0' && *here <= '9'; };
-    const auto skip_digits = [&] { here = detail::skip_digits(here, end); };
-    const auto here_is = [&here, this](char c) { return here != end && *here == c; };
-    const auto fail_here = [&](ParseResult result, std::string_view note = {}) {
-        if (here == end && !last) {
-            return need_more();
-        }
-        cursor = here;
-        return fail(result, note);
-    };
-    if (here_is('-')) {
-        ++here;
-        if (!digit_here()) {
-            return fail_here(ParseResult::MISSING_QUANTITY_AFTER_SIGN);
-        }
-    }
-    if (!digit_here()) {
-        return fail_here(ParseResult::MISSING_LEADING_DIGIT, "no JSON value starts here");
-    }
-    if (*here == '0') {
-        ++here; // no further digits after a leading zero
-    } else {
-        skip_digits();
-    }
-    if (here_is('.')) {
-        ++here;
-        if (!digit_here()) {
-            return fail_here(ParseResult::INVALID_FRACTION);
-        }
-        skip_digits();
-    }
-    if (here_is('e') || here_is('E')) {
-        ++here;
-        if (here_is('+') || here_is('-')) {
-            ++here;
-        }
-        if (!digit_here()) {
-            return fail_here(ParseResult::INVALID_EXPONENT);
-        }
-        skip_digits();
-    }
+    // Scanned with local pointers, which the compiler keeps in registers (the member would be
+    // written back at every digit); `cursor` takes the end at every exit.
+    const NumberScan scan = scan_number(start, end);
+    const char* const here = scan.end;
     if (here == end && !last) {
-        return need_more(); // more digits may follow
+        return need_more(); // more digits may follow, or the text it still needs
+    }
+    if (scan.error != ParseResult::SUCCESS) {
+        cursor = here;
+        return fail(scan.error, scan.error == ParseResult::MISSING_LEADING_DIGIT
+                                    ? "no JSON value starts here"
+                                    : std::string_view());
     }
     cursor = here;
     const auto length = static_cast<std::size_t>(here - start);

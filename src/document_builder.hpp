@@ -1,162 +1,24 @@
-#ifndef JSON_DETAIL_DOCUMENT_BUILDER_HPP
-#define JSON_DETAIL_DOCUMENT_BUILDER_HPP
+#ifndef JSON_SRC_DOCUMENT_BUILDER_HPP
+#define JSON_SRC_DOCUMENT_BUILDER_HPP
 
-// The handler behind json::parse: builds a Value from the grammar's events. Included by
-// json/parse.hpp after the declarations it uses.
+// The handler behind json::parse: builds a Value from the grammar's events.
 
-#include <json/detail/grammar.hpp>
+#include "document_checks.hpp"
+#include "number.hpp"
+
 #include <json/detail/workspace.hpp>
 #include <json/value.hpp>
 
 #include <algorithm>
-#include <cfloat>
-#include <cmath>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
 #include <optional>
 #include <string>
 #include <string_view>
-#include <unordered_set>
 #include <utility>
-#include <vector>
 
 namespace json::detail {
-
-/// `digits` times ten to the power `exponent`, when one rounding gives it: digits below 2^53
-/// and a power of ten of at most 10^22 either way are both doubles exactly, so the one product
-/// or quotient is the double nearest to the number, as the number-text library gives it.
-/// Nothing otherwise.
-inline std::optional<double> scaled_exactly(std::uint64_t digits, long long exponent) {
-    constexpr std::uint64_t exact_integers = std::uint64_t{1} << 53U;
-    constexpr long long largest_exact_power = 22;
-    static constexpr double powers_of_ten[largest_exact_power + 1] = {
-        1e0,  1e1,  1e2,  1e3,  1e4,  1e5,  1e6,  1e7,  1e8,  1e9,  1e10, 1e11,
-        1e12, 1e13, 1e14, 1e15, 1e16, 1e17, 1e18, 1e19, 1e20, 1e21, 1e22};
-    if (digits > exact_integers || exponent < -largest_exact_power ||
-        exponent > largest_exact_power) {
-        return std::nullopt;
-    }
-    const auto number = static_cast<double>(digits);
-    const double power = powers_of_ten[exponent < 0 ? -exponent : exponent];
-    return exponent < 0 ? number / power : number * power;
-}
-
-/// The double nearest to a JSON number `literal` (NUL-terminated). A literal without an
-/// exponent whose digits, the point left out, number at most fifteen is converted here, by
-/// scaled_exactly: those digits are below 2^53 and the power of ten at most 10^15. Most numbers in
-/// documents (counts, ids, coordinates, prices) take this path; the others go to the library.
-inline double literal_to_double(std::string_view literal) {
-    constexpr std::ptrdiff_t most_digits = 15;
-    // A sign, fifteen digits and a point at most: longer literals are not read twice.
-    if (literal.size() > most_digits + 2) {
-        return string_to_double(literal.data());
-    }
-    const auto is_digit = [](char c) { return c >= '0' && c <= '9'; };
-    const char* next = literal.data();
-    const char* const end = next + literal.size();
-    const bool negative = *next == '-';
-    next += negative ? 1 : 0;
-    std::uint64_t digits = 0;
-    const auto read_digits = [&] {
-        const char* const first = next;
-        for (; next != end && is_digit(*next); ++next) {
-            digits = 10 * digits + static_cast<std::uint64_t>(*next - '0');
-        }
-        return next - first;
-    };
-    std::ptrdiff_t count = read_digits();
-    std::ptrdiff_t decimals = 0;
-    if (next != end && *next == '.') {
-        ++next;
-        decimals = read_digits();
-        count += decimals;
-    }
-    if (next != end || count > most_digits) {
-        return string_to_double(literal.data()); // an exponent, or too many digits
-    }
-    const double magnitude = *scaled_exactly(digits, -decimals);
-    return negative ? -magnitude : magnitude;
-}
-
-/// Reads the JSON number `literal` (NUL-terminated) into `value` and tells whether the writer
-/// writes it back as the same decimal number. Up to fifteen significant digits (the literal
-/// has at least as many characters) come back unchanged from a normal double (DBL_DIG), and
-/// the writer writes every double below 2^53 with its shortest digits; anything else is read
-/// and checked in one pass by read_number_exactly.
-inline bool read_exactly(std::string_view literal, double& value) {
-    if (literal.size() <= DBL_DIG) {
-        constexpr double exact_integers = 9007199254740992.0; // 2^53
-        value = literal_to_double(literal);
-        const double magnitude = std::fabs(value);
-        if (magnitude >= DBL_MIN && magnitude <= exact_integers) {
-            return true;
-        }
-    }
-    return read_number_exactly(literal, value);
-}
-
-/// A handler's refusal of the document (the builder's, the validator's): which, and where
-/// when that is not the token being reported. Each refuse function returns false, for the
-/// handler to return.
-class DocumentRefusal {
-  public:
-    [[gnu::cold]] bool inexact(std::string_view literal) {
-        constexpr std::size_t shown = 40;
-        std::string text(literal.substr(0, shown));
-        if (literal.size() > shown) {
-            text += "...";
-        }
-        text += " cannot be held exactly by a double; without the exact_numbers option it is "
-                "rounded";
-        return refuse(Refusal::INEXACT_NUMBER, ParseResult::INVALID_EXPONENT, std::move(text));
-    }
-    /// A member name given a second time, at the token being reported.
-    [[gnu::cold]] bool repeated_name() {
-        return refuse(Refusal::DUPLICATE_KEY, ParseResult::MISSING_TRAILING_BRACE,
-                      "the object already has a member of this name; without the "
-                      "reject_duplicate_keys option the last one wins");
-    }
-
-    /// When the grammar stopped because of this refusal, puts it in `report` (the place is
-    /// the grammar's: the token being reported).
-    void explain(ParseReport& report) {
-        if (report.refusal != Refusal::STOPPED || refused == Refusal::NONE) {
-            return;
-        }
-        report.refusal = refused;
-        report.result = result;
-        report.note = std::move(note);
-    }
-
-  private:
-    bool refuse(Refusal why, ParseResult code, std::string text) {
-        refused = why;
-        result = code;
-        note = std::move(text);
-        return false;
-    }
-
-    Refusal refused = Refusal::NONE;
-    ParseResult result = ParseResult::SUCCESS;
-    std::string note;
-};
-
-/// The member names of the open objects, where repeated names are refused: the second of
-/// them is found when it comes. Memory: the names of the open objects.
-class MemberNames {
-  public:
-    void open_object() { open_objects.emplace_back(); }
-    void close_object() { open_objects.pop_back(); }
-    /// False when the innermost open object already has a member of this name. Kept out of
-    /// line: only documents parsed with reject_duplicate_keys call it.
-    [[gnu::noinline]] bool add(std::string_view name) {
-        return open_objects.back().emplace(name).second;
-    }
-
-  private:
-    std::vector<std::unordered_set<std::string>> open_objects;
-};
 
 /// Builds the document of one parse from the grammar's events, every container once at its
 /// final size, its children handed over without a copy. Here, where the document is made,
@@ -192,8 +54,8 @@ class DocumentBuilder {
     bool number(std::string_view literal) {
         double value = 0.0;
         if (!options.exact_numbers) {
-            value = literal_to_double(literal);
-        } else if (!read_exactly(literal, value)) {
+            value = read_number(literal);
+        } else if (!read_number_exactly(literal, value)) {
             return refusal.inexact(literal);
         }
         push(Kind::NUMBER).number = value;

@@ -1,0 +1,62 @@
+#ifndef JSON_SRC_NUMBER_HPP
+#define JSON_SRC_NUMBER_HPP
+
+// Numbers between text and double: the one place that reads a JSON number's text into a double,
+// tells whether it survives the round trip, and writes a double's text. The only caller of the
+// number-text library. (The syntax of a number is json/detail/number_syntax.hpp's.)
+
+#include <number_text.hpp>
+
+#include <cstddef>
+#include <cstdint>
+#include <cstring>
+#include <optional>
+#include <string_view>
+#include <type_traits>
+
+namespace json::detail {
+
+/// `digits` times ten to the power `exponent`, when one rounding gives it: digits up to 2^53
+/// and a power of ten of at most 10^22 either way are both doubles exactly, so the one product
+/// or quotient is the double nearest to the number. Nothing otherwise. Throws nothing.
+std::optional<double> scaled_exactly(std::uint64_t digits, long long exponent) noexcept;
+
+/// The double nearest to the JSON number `literal`, which must be NUL-terminated (a number of
+/// up to fifteen digits without an exponent is converted here, others by the number-text
+/// library). Throws nothing.
+double read_number(std::string_view literal) noexcept;
+
+/// Reads the JSON number `literal` (NUL-terminated) into `value`, the double read_number gives,
+/// and tells whether write_number writes that double back as text that denotes the same
+/// decimal number (`1.50` and `1.5`, `1E2` and `100`, `-0` and `0` do). Constant time for up to
+/// fifteen significant digits between DBL_MIN and 2^53, and for up to nineteen between 2^-5 and
+/// 2^53; other numbers are written out and compared digit by digit. Throws nothing.
+bool read_number_exactly(std::string_view literal, double& value) noexcept;
+
+/// The room the number-text library is given for a number's text.
+constexpr std::size_t NUMBER_TEXT_SIZE = 80;
+
+/// Writes the shortest text that reads back to the finite `number` into the NUMBER_TEXT_SIZE
+/// bytes at `buffer`, zero-filled first as the number-text library expects, and returns the end
+/// of the text (its first NUL). Inline: the writer calls it for every number. Throws nothing.
+template <typename Number>
+char* write_number(char* buffer, Number number) noexcept {
+    std::memset(buffer, 0, NUMBER_TEXT_SIZE);
+    if constexpr (std::is_same_v<Number, float>) {
+        getFloatValueStr(buffer, number);
+    } else {
+        getDoubleValueStr(buffer, number);
+    }
+    // Read a byte at a time on purpose: the text was stored a byte or two at a time an instant
+    // ago, and a wider load over those stores cannot be served from the store buffer and waits
+    // for them to reach the cache, which costs more than the few byte loads of a number's text.
+    char* end = buffer;
+    while (end != buffer + NUMBER_TEXT_SIZE && *end != '\0') {
+        ++end;
+    }
+    return end;
+}
+
+} // namespace json::detail
+
+#endif
