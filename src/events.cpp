@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <ios>
+#include <istream>
 #include <new>
 
 namespace json {

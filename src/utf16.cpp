@@ -38,11 +38,13 @@ class Utf16Decoder::Converter {
 
 Utf16Decoder::Utf16Decoder() noexcept = default;
 
-Utf16Decoder::~Utf16Decoder() = default;
+Utf16Decoder::~Utf16Decoder() {
+    delete converter;
+}
 
 void Utf16Decoder::append(std::string& text, const char16_t* units, std::size_t count) {
-    if (!converter) {
-        converter = std::make_unique<Converter>();
+    if (converter == nullptr) {
+        converter = new Converter();
     }
     converter->append(text, units, count);
 }

@@ -113,4 +113,8 @@ const Value& Value::at_pointer(std::string_view pointer) const {
     return Pointer(pointer).at(*this);
 }
 
+std::string Value::value_or(const std::string& key, const char* fallback) const {
+    return value_or<std::string>(key, fallback);
+}
+
 } // namespace json

@@ -249,16 +249,17 @@ void Writer::State::check_document(const Value& document) const {
 }
 
 Writer::Writer(std::string& text, const WriteOptions& options)
-    : state(std::make_unique<State>(text, options)) {}
+    : state(new State(text, options)) {}
 
 Writer::Writer(std::ostream& out, const WriteOptions& options)
-    : state(std::make_unique<State>(out, options)) {}
+    : state(new State(out, options)) {}
 
 Writer::~Writer() {
     try {
         state->finish();
     } catch (...) { // NOLINT(bugprone-empty-catch): a destructor cannot report it
     }
+    delete state;
 }
 
 bool Writer::null() {

@@ -33,10 +33,8 @@
 #include <boost/mp11/algorithm.hpp>
 
 #include <array>
-#include <cmath>
 #include <cstddef>
 #include <cstdint>
-#include <iterator>
 #include <limits>
 #include <optional>
 #include <stdexcept>
@@ -239,6 +237,25 @@ inline auto next_element_of(Array& items) {
     };
 }
 
+template <typename T, typename = void>
+struct has_size : std::false_type {};
+template <typename T>
+struct has_size<T, std::void_t<decltype(std::declval<const T&>().size())>> : std::true_type {};
+
+// How many items a range has: its size(), or counted where it has none (std::forward_list).
+template <typename Range>
+std::size_t size_of(const Range& range) {
+    if constexpr (has_size<Range>::value) {
+        return static_cast<std::size_t>(range.size());
+    } else {
+        std::size_t size = 0;
+        for (auto item = range.begin(); item != range.end(); ++item) {
+            ++size;
+        }
+        return size;
+    }
+}
+
 template <typename Range>
 Array array_from(const Range& range, std::size_t size) {
     Array items;
@@ -291,8 +308,7 @@ auto to_alternative(const T& value) {
         }
         return members;
     } else if constexpr (category == Category::FIXED_SIZE || category == Category::SEQUENCE) {
-        return array_from(value,
-                          static_cast<std::size_t>(std::distance(value.begin(), value.end())));
+        return array_from(value, size_of(value));
     } else {
         static_assert(always_false<T>,
                       "no conversion to json::Value: describe the type with Boost.Describe or "
@@ -333,6 +349,16 @@ T to_integer(const Value& in) {
     return static_cast<T>(number);
 }
 
+// 2^exponent, for 0 <= exponent < 1024. Kept here rather than std::ldexp: <cmath> would be the
+// largest header this one brings in.
+constexpr double power_of_two(int exponent) {
+    double power = 1.0;
+    for (int i = 0; i < exponent; ++i) {
+        power *= 2.0;
+    }
+    return power;
+}
+
 template <typename T>
 T to_floating(const Value& in) {
     const double number = in.as_number();
@@ -342,10 +368,12 @@ T to_floating(const Value& in) {
         // rounds to even, which is that power, beyond the range. So the shortest text of the
         // largest float, 3.4028235e+38, which is above FLT_MAX, converts back to it.
         using limits = std::numeric_limits<T>;
-        const double halfway =
+        constexpr double halfway =
             static_cast<double>(limits::max()) +
-            std::ldexp(1.0, limits::max_exponent - limits::digits - 1); // half its last step
-        if (std::isfinite(number) && std::fabs(number) >= halfway) {
+            power_of_two(limits::max_exponent - limits::digits - 1); // half its last step
+        constexpr double infinity = std::numeric_limits<double>::infinity();
+        if ((number >= halfway || number <= -halfway) && number != infinity &&
+            number != -infinity) {
             throw_not_a_float(number);
         }
     }
@@ -525,10 +553,6 @@ T Value::value_or(const std::string& key, const T& fallback) const {
         return fallback;
     }
     return detail::below(key, [&] { return value_to<T>(*member); });
-}
-
-inline std::string Value::value_or(const std::string& key, const char* fallback) const {
-    return value_or<std::string>(key, fallback);
 }
 
 } // namespace json

@@ -9,7 +9,7 @@
 #include <json/parse_options.hpp>
 
 #include <cstddef>
-#include <istream>
+#include <iosfwd>
 #include <string>
 #include <string_view>
 

@@ -4,7 +4,7 @@
 #include <json/detail/export.hpp>
 #include <json/value.hpp>
 
-#include <ostream>
+#include <iosfwd>
 #include <string>
 
 namespace json {

@@ -2,6 +2,7 @@
 #define JSON_VALUE_HPP
 
 #include <json/detail/export.hpp>
+#include <json/fwd.hpp>
 #include <json/kind.hpp>
 
 #include <boost/variant.hpp>
@@ -30,14 +31,6 @@ class JSONVALUE_API Null {
     // Not noexcept, for the same reason as Undefined().
     Null() {} // NOLINT(modernize-use-equals-default)
 };
-
-class Value;
-
-/// A JSON array: elements in insertion order.
-using Array = std::vector<Value>;
-
-/// A JSON object: each key once, members in ascending byte-wise (unsigned) key order.
-using Object = std::map<std::string, Value>;
 
 namespace detail {
 
@@ -281,14 +274,17 @@ class JSONVALUE_API Value : public detail::ValueVariant {
     /// @copydoc at_pointer
     const Value& at_pointer(std::string_view pointer) const;
 
-    /// The member named `key` converted with json::value_to<T> (json/convert.hpp), or
-    /// `fallback` when there is no such member. A member that does not convert throws as
-    /// value_to does, with "/key" at the start of the message: it is never replaced by the
-    /// fallback. Throws std::invalid_argument when this is no Object.
+    /// The member named `key` converted with json::value_to<T>, or `fallback` when there is
+    /// no such member. A member that does not convert throws as value_to does, with "/key" at
+    /// the start of the message: it is never replaced by the fallback. Throws
+    /// std::invalid_argument when this is no Object. Defined with the conversions, in
+    /// json/convert.hpp (which json/json.hpp includes), so that this header alone does not
+    /// bring them in.
     template <typename T>
     T value_or(const std::string& key, const T& fallback) const;
     /// The member named `key` as a std::string, or `fallback`: value_or<std::string>, so that
     /// a string literal (or any `const char*`) can be the fallback. Throws as value_or does.
+    /// Needs no other header.
     std::string value_or(const std::string& key, const char* fallback) const;
 };
 
@@ -329,8 +325,5 @@ bool operator!=(const Value& left, const T& right) {
 }
 
 } // namespace json
-
-// Value::value_or converts with value_to.
-#include <json/convert.hpp>
 
 #endif

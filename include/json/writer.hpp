@@ -5,8 +5,7 @@
 #include <json/serializer.hpp>
 #include <json/value.hpp>
 
-#include <memory>
-#include <ostream>
+#include <iosfwd>
 #include <string>
 #include <string_view>
 
@@ -108,7 +107,8 @@ class JSONVALUE_API Writer {
 
   private:
     class State;
-    std::unique_ptr<State> state;
+    // Owned; a plain pointer, so that this header does not bring in <memory>.
+    State* state;
 };
 
 } // namespace json

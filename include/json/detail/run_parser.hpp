@@ -11,7 +11,7 @@
 
 #include <algorithm>
 #include <cstddef>
-#include <istream>
+#include <iosfwd>
 #include <string>
 #include <string_view>
 #include <type_traits>

@@ -7,7 +7,6 @@
 #include <json/detail/export.hpp>
 
 #include <cstddef>
-#include <memory>
 #include <string>
 
 namespace json::detail {
@@ -28,7 +27,8 @@ class JSONVALUE_API Utf16Decoder {
 
   private:
     class Converter;
-    std::unique_ptr<Converter> converter;
+    // Owned; a plain pointer, so that this header does not bring in <memory>.
+    Converter* converter = nullptr;
 };
 
 } // namespace json::detail

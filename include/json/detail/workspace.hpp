@@ -6,7 +6,6 @@
 
 #include <cstddef>
 #include <functional>
-#include <memory>
 #include <new>
 #include <vector>
 
@@ -30,13 +29,13 @@ class Workspace {
     Workspace& operator=(const Workspace&) = delete;
     ~Workspace() = default;
 
-    /// `bytes` aligned for any type of at most `alignment`; throws std::bad_alloc.
+    /// `bytes` aligned for any type of at most `alignment` (a power of two, at most that of
+    /// std::max_align_t, as the storage is); throws std::bad_alloc.
     void* allocate(std::size_t bytes, std::size_t alignment) {
-        void* place = next;
-        std::size_t space = WORKSPACE_SIZE - static_cast<std::size_t>(next - storage);
-        if (std::align(alignment, bytes, place, space) != nullptr) {
-            next = static_cast<std::byte*>(place) + bytes;
-            return place;
+        const std::size_t start = (used + alignment - 1) & ~(alignment - 1);
+        if (start <= WORKSPACE_SIZE && bytes <= WORKSPACE_SIZE - start) {
+            used = start + bytes;
+            return storage + start;
         }
         return ::operator new(bytes);
     }
@@ -47,14 +46,14 @@ class Workspace {
         const std::less<const std::byte*> before;
         if (before(first, storage) || !before(first, storage + WORKSPACE_SIZE)) {
             ::operator delete(block); // unsized: not every compiler declares the sized form
-        } else if (first + bytes == next) {
-            next = first;
+        } else if (first + bytes == storage + used) {
+            used = static_cast<std::size_t>(first - storage);
         }
     }
 
   private:
     alignas(std::max_align_t) std::byte storage[WORKSPACE_SIZE];
-    std::byte* next = storage;
+    std::size_t used = 0; // the bytes of the storage handed out, the last block's end
 };
 
 /// An allocator whose memory comes from a Workspace (for the element types of the working
