@@ -5,6 +5,8 @@ include(CMakePackageConfigHelpers)
 set(JSONVALUE_CMAKE_DIR ${CMAKE_INSTALL_LIBDIR}/cmake/jsonvalue)
 
 install(DIRECTORY include/json TYPE INCLUDE)
+install(FILES ${CMAKE_CURRENT_BINARY_DIR}/include/json/version.hpp
+  DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/json)
 install(TARGETS jsonvalue jsonvalue_number_text jsonvalue_text_encoding
   EXPORT jsonvalueTargets
   LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}

@@ -9,6 +9,7 @@
 #include "pointer_filter.hpp"
 
 #include <json/json.hpp>
+#include <json/version.hpp>
 
 #include <CLI/CLI.hpp>
 
@@ -30,8 +31,6 @@
 #include <vector>
 
 namespace {
-
-constexpr const char* VERSION = "0.1.0";
 
 enum ExitStatus { VALID = 0, INVALID = 1, TROUBLE = 2 };
 
@@ -530,7 +529,7 @@ bool read_arguments(int argc, char** argv, Settings& settings, int& status) {
                            : std::string("needs a positive number");
             },
             ""));
-    app.set_version_flag("--version", std::string("jsonfmt ") + VERSION,
+    app.set_version_flag("--version", std::string("jsonfmt ") + JSONVALUE_VERSION_STRING,
                          "show the version and exit");
     app.add_option("FILE", settings.files, "the documents to read")->type_name("");
     app.footer("Exit status: 0 when every document is valid, 1 when one is invalid or refused,\n"

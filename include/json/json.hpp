@@ -2,13 +2,14 @@
 #define JSON_JSON_HPP
 
 // Everything jsonvalue offers: the value model, conversions, the builders, the writers
-// (from a document or from events) and parsing.
+// (from a document or from events), parsing, and the version macros.
 #include <json/builders.hpp>
 #include <json/convert.hpp>
 #include <json/events.hpp>
 #include <json/parse.hpp>
 #include <json/serializer.hpp>
 #include <json/value.hpp>
+#include <json/version.hpp>
 #include <json/writer.hpp>
 
 #endif

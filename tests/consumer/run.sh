@@ -24,5 +24,3 @@ export PKG_CONFIG_PATH="$libdir/pkgconfig"
 g++ -std=c++20 -o "$work/pkg-config-consumer" "$consumer_dir/main.cpp" \
     $(pkg-config --cflags --libs jsonvalue)
 env -u LD_LIBRARY_PATH "$work/pkg-config-consumer"
-
-"$work/prefix/bin/jsonfmt" --version
