@@ -1,9 +1,10 @@
 #!/usr/bin/env bash
-# Builds a host project that takes jsonvalue's source tree in, once with add_subdirectory and
-# once with FetchContent, in a configuration where looking for CLI11, GoogleTest, Google
-# Benchmark or Doxygen fails: an embedded jsonvalue needs none of them. Runs each host's
-# program, checks that it needs libjsonvalue.so at run time, and installs each host: its
-# program must be all that lands in the prefix.
+# Builds a host project that takes jsonvalue's source tree in, once with add_subdirectory
+# (jsonvalue shared, its default) and once with FetchContent (static, as the host asks), in a
+# configuration where looking for CLI11, GoogleTest, Google Benchmark or Doxygen fails: an
+# embedded jsonvalue needs none of them. Runs each host's program, checks that it needs
+# libjsonvalue.so at run time exactly when jsonvalue was built shared, and installs each host:
+# its program must be all that lands in the prefix.
 # Usage: run.sh SOURCE_DIR EMBEDDING_DIR
 set -euo pipefail
 source_dir=$1
@@ -44,4 +45,4 @@ embed() {
 }
 
 embed add_subdirectory 1
-embed FetchContent 1
+embed FetchContent 0 -DBUILD_SHARED_LIBS=OFF
