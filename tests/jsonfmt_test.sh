@@ -8,6 +8,8 @@ set -uo pipefail
 jsonfmt=$1
 man_page=$2
 mode=${3:-plain}
+here=$(cd "$(dirname "$0")" && pwd)
+source "$here/support/missing.sh"
 work=$(mktemp -d)
 trap 'chmod -R u+w "$work"; rm -rf "$work"' EXIT
 # The read-only directory case runs as another user, who must reach the files.
@@ -18,6 +20,8 @@ failures=0
 pass() { echo "ok   $1"; passed=$((passed + 1)); }
 fail() { echo "FAIL $1"; failures=$((failures + 1)); }
 skip() { echo "skip $1"; }
+# absent NAME WHAT: a case that needs WHAT, which only scripts/install-deps.sh installs
+absent() { missing "$1: $2" || failures=$((failures + 1)); }
 # check NAME COMMAND...: a case that passes when COMMAND succeeds
 check() {
     local name=$1
@@ -426,6 +430,8 @@ fi
 # a pipe. Release builds only: sanitizers and debug code are too slow and too large for it.
 if [ "$mode" = sanitized ]; then
     skip "stream-300MB: needs a release build"
+elif [ ! -x /usr/bin/time ]; then
+    absent stream-300MB "GNU time (/usr/bin/time, Debian package time)"
 else
     record='{"id": 1234567890123456789, "name": "user", "tags": [1.50, 2e400, "x"], "id": 1},'
     count=3700000
@@ -465,7 +471,7 @@ done
 if command -v man >/dev/null; then
     check man-page [ -z "$(man --warnings -l "$man_page" 2>&1 >/dev/null)" ]
 else
-    skip "man-page: man is not installed"
+    absent man-page "man (Debian package man-db)"
 fi
 
 echo "$passed passed, $failures failed"

@@ -10,6 +10,8 @@ set -euo pipefail
 prefix=$1
 consumer_dir=$2
 linkage=$3
+here=$(cd "$(dirname "$0")" && pwd)
+source "$here/../support/missing.sh"
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
 
@@ -32,6 +34,10 @@ run "$work/cmake-build/consumer"
 run "$work/cmake-build/read_config" "$consumer_dir/../../examples/config.json" |
     diff - "$consumer_dir/read_config.expected"
 
+if ! command -v pkg-config >/dev/null; then
+    missing "pkg-config, for the pkg-config consumer," || exit 1
+    exit 0
+fi
 export PKG_CONFIG_PATH
 PKG_CONFIG_PATH=$(dirname "$(find "$prefix" -name jsonvalue.pc)")
 static=()
