@@ -11,7 +11,7 @@ seconds=${1:-60}
 scripts/install-deps.sh >/dev/null
 CXX=clang++-14 cmake -S . -B build/fuzz -DCMAKE_BUILD_TYPE=RelWithDebInfo \
     -DJSONVALUE_BUILD_FUZZERS=ON -DJSONVALUE_BUILD_TESTS=OFF -DJSONVALUE_BUILD_EXAMPLES=OFF \
-    >/dev/null
+    -DJSONVALUE_BUILD_TOOLS=OFF >/dev/null
 cmake --build build/fuzz -j "$(nproc)" >/dev/null
 
 for target in parse_fuzzer round_trip_fuzzer events_fuzzer utf16_fuzzer; do
