@@ -34,6 +34,7 @@ says "json/version.hpp: STRING" "${text//\"/}"
 
 pc=$(find "$prefix" -name jsonvalue.pc)
 says jsonvalue.pc "$(sed -n 's/^Version: //p' "$pc")"
+# shellcheck disable=SC2016 # a CMake variable, for cmake to expand
 printf 'include("%s")\nmessage("${PACKAGE_VERSION}")\n' \
     "$(find "$prefix" -name jsonvalueConfigVersion.cmake)" >"$work/package_version.cmake"
 says jsonvalueConfigVersion.cmake "$(cmake -P "$work/package_version.cmake" 2>&1)"

@@ -3,8 +3,8 @@
 # (jsonvalue shared, its default) and once with FetchContent (static, as the host asks), in a
 # configuration where looking for CLI11, GoogleTest, Google Benchmark or Doxygen fails: an
 # embedded jsonvalue needs none of them. Runs each host's program, checks that it needs
-# libjsonvalue.so at run time exactly when jsonvalue was built shared, and installs each host:
-# its program must be all that lands in the prefix.
+# libjsonvalue.so at run time when jsonvalue was built shared and no library of jsonvalue's when
+# static, and installs each host: its program must be all that lands in the prefix.
 # Usage: run.sh SOURCE_DIR EMBEDDING_DIR
 set -euo pipefail
 source_dir=$1
@@ -20,7 +20,7 @@ for package in CLI11 GTest benchmark Doxygen; do
 done
 
 # embed WAY SHARED_LIBRARIES [CMAKE_ARGS...]: the host built with jsonvalue taken in by WAY;
-# SHARED_LIBRARIES is how many libjsonvalue.so its program must need (1 or 0)
+# SHARED_LIBRARIES is how many shared libraries of jsonvalue's its program needs (1 or 0)
 embed() {
     local way=$1 shared=$2 build=$work/$1
     shift 2
@@ -29,9 +29,9 @@ embed() {
     cmake --build "$build" --parallel 2 >/dev/null
     "$build/jsonvalue_host"
     local needed
-    needed=$(readelf -d "$build/jsonvalue_host" | grep -c 'NEEDED.*\[libjsonvalue\.so' || true)
+    needed=$(readelf -d "$build/jsonvalue_host" | grep -c 'NEEDED.*\[libjsonvalue' || true)
     if [ "$needed" != "$shared" ]; then
-        echo "$way: the host's program needs libjsonvalue.so $needed times, not $shared"
+        echo "$way: the host's program needs $needed shared libraries of jsonvalue's, not $shared"
         exit 1
     fi
     cmake --install "$build" --prefix "$work/$way-prefix" >/dev/null

@@ -1,3 +1,4 @@
+# shellcheck shell=bash
 # Sourced by the shell tests. missing WHAT: a check left out for want of WHAT, which only
 # scripts/install-deps.sh sets up. Says so and how to get it, and returns 0 (skipped); returns 1
 # (failed) when JSONVALUE_REQUIRE_SETUP=1, which scripts/test.sh sets after the set-up.
