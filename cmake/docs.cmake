@@ -1,5 +1,5 @@
 # `cmake --build BUILD --target docs` builds the API reference (HTML) from the comments in
-# include/json/; any Doxygen warning fails the build.
+# include/json/ and the generated json/version.hpp; any Doxygen warning fails the build.
 find_package(Doxygen)
 if(DOXYGEN_FOUND)
   set(DOXYGEN_PROJECT_NAME jsonvalue)
@@ -15,5 +15,6 @@ if(DOXYGEN_FOUND)
   set(DOXYGEN_MACRO_EXPANSION YES)
   set(DOXYGEN_PREDEFINED "JSONVALUE_API=")
   doxygen_add_docs(docs ${CMAKE_CURRENT_SOURCE_DIR}/include/json
+                   ${CMAKE_CURRENT_BINARY_DIR}/include/json/version.hpp
                    COMMENT "API reference in ${CMAKE_CURRENT_BINARY_DIR}/docs/html")
 endif()

@@ -1,22 +1,20 @@
 #!/usr/bin/env bash
 # Checks that the README's two commands work on a fresh Debian 12 machine: makes a minimal
 # bookworm root with debootstrap (variant minbase, nothing added), clones the committed HEAD of
-# this checkout into it with the test data beside the clone, and runs scripts/format-sample.sh
-# and then scripts/test.sh in it as root through chroot. Prints PASS or FAIL for each and
-# exits non-zero when one fails.
+# this checkout into it (nothing beside the clone: the test data is part of the repository), and
+# runs scripts/format-sample.sh and then scripts/test.sh in it as root through chroot. Prints
+# PASS or FAIL for each and exits non-zero when one fails.
 # Usage (as root): fresh-debian.sh [--worktree] [WORK_DIR]
 #   --worktree  also copy the checkout's uncommitted changes and new files into the clone
 #   WORK_DIR    default build-infra/fresh-debian in the checkout. The pristine root is kept
 #               there as a tarball and downloaded packages in apt-archives/, so a second run
 #               skips debootstrap and the downloads (the packages are still installed afresh).
-# The test data is read from $JSONVALUE_DATA_DIR (default ../shared/data beside the checkout).
 set -euo pipefail
 repo=$(cd "$(dirname "$0")/.." && pwd)
 worktree=false
 if [ "${1:-}" = --worktree ]; then worktree=true; shift; fi
 mkdir -p "${1:-$repo/build-infra/fresh-debian}"
 work=$(cd "${1:-$repo/build-infra/fresh-debian}" && pwd)
-data=$(cd "${JSONVALUE_DATA_DIR:-$repo/../shared/data}" && pwd)
 root=$work/root
 tarball=$work/bookworm-minbase.tar
 mirror=http://deb.debian.org/debian
@@ -65,9 +63,6 @@ if $worktree; then
 fi
 echo "== testing $(git -C "$root/src/jsonvalue" log -1 --format='%h %s')$($worktree && echo ' with uncommitted changes')"
 
-mkdir -p "$root/src/shared/data"
-mount --bind "$data" "$root/src/shared/data"
-mount -o remount,bind,ro "$root/src/shared/data"
 mount -t proc proc "$root/proc"
 mount -t sysfs sysfs "$root/sys"
 mount --rbind /dev "$root/dev"

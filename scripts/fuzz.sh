@@ -1,17 +1,17 @@
 #!/usr/bin/env bash
 # Builds the libFuzzer targets with clang and runs each for SECONDS (default 60), seeded from
-# the parsing test suite and the benchmark documents (read in place; new inputs go to
-# build/fuzz/corpus/TARGET, which later runs start from). Usage: fuzz.sh [SECONDS]
+# the parsing test suite and the benchmark documents (tests/data/JSONTestSuite/test_parsing and
+# bench/data, read in place; new inputs go to build/fuzz/corpus/TARGET, which later runs start
+# from). Usage: fuzz.sh [SECONDS]
 set -euo pipefail
 root=$(cd "$(dirname "$0")/.." && pwd)
 cd "$root"
 seconds=${1:-60}
-data=${JSONVALUE_DATA_DIR:-$root/../shared/data}
 
 scripts/install-deps.sh >/dev/null
 CXX=clang++-14 cmake -S . -B build/fuzz -DCMAKE_BUILD_TYPE=RelWithDebInfo \
     -DJSONVALUE_BUILD_FUZZERS=ON -DJSONVALUE_BUILD_TESTS=OFF -DJSONVALUE_BUILD_EXAMPLES=OFF \
-    >/dev/null
+    -DJSONVALUE_BUILD_TOOLS=OFF >/dev/null
 cmake --build build/fuzz -j "$(nproc)" >/dev/null
 
 for target in parse_fuzzer round_trip_fuzzer events_fuzzer utf16_fuzzer; do
@@ -20,7 +20,7 @@ for target in parse_fuzzer round_trip_fuzzer events_fuzzer utf16_fuzzer; do
     log=build/fuzz/$target.log
     if ! build/fuzz/fuzz/$target -max_total_time="$seconds" -max_len=8192 -timeout=10 \
         -rss_limit_mb=4096 -print_final_stats=1 -artifact_prefix=build/fuzz/ \
-        "$corpus" "$data/JSONTestSuite/test_parsing" "$data/bench" >"$log" 2>&1; then
+        "$corpus" tests/data/JSONTestSuite/test_parsing bench/data >"$log" 2>&1; then
         tail -40 "$log"
         echo "$target failed: the input that failed is in build/fuzz/"
         exit 1

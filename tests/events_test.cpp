@@ -135,13 +135,11 @@ TEST(Events, StoppedAtEveryEvent) {
 // Text given whole and a stream read a byte at a time give the same events and the same
 // report, on the conformance suite and the benchmark documents, with several option sets;
 // json::validate gives json::parse's report on every one of them, from text and from a stream.
-#ifdef JSON_DATA_DIR
 TEST(Events, TextStreamAndValidationAgree) {
-    const std::filesystem::path data = JSON_DATA_DIR;
-    std::vector<std::filesystem::path> files = {
-        data / "bench/twitter.json", data / "bench/citm_catalog.json", data / "bench/canada.json"};
-    for (const auto& entry :
-         std::filesystem::directory_iterator(data / "JSONTestSuite/test_parsing")) {
+    const std::filesystem::path bench = JSON_BENCH_DATA_DIR;
+    std::vector<std::filesystem::path> files = {bench / "twitter.json", bench / "citm_catalog.json",
+                                                bench / "canada.json"};
+    for (const auto& entry : std::filesystem::directory_iterator(JSON_TEST_PARSING_DIR)) {
         files.push_back(entry.path());
     }
     ParseOptions strict;
@@ -184,7 +182,6 @@ TEST(Events, TextStreamAndValidationAgree) {
         }
     }
 }
-#endif
 
 // Reformatting through the Writer keeps member order, repeated members and literals.
 TEST(Events, WriterKeepsWhatItIsGiven) {

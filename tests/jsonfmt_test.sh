@@ -1,17 +1,21 @@
 #!/usr/bin/env bash
-# Checks jsonfmt's output, its error messages, its exit codes and the files it writes.
-# Usage: jsonfmt_test.sh JSONFMT sanitized|plain FAILING_READ FEED_IN_PIECES CONFORMANCE_DIR
+# Checks jsonfmt's output, its error messages, its exit codes and the files it writes, and that
+# its man page renders.
+# Usage: jsonfmt_test.sh JSONFMT MAN_PAGE sanitized|plain FAILING_READ FEED_IN_PIECES
+#        CONFORMANCE_DIR
 # "sanitized" skips the cases under ulimit -v: AddressSanitizer reserves terabytes of address
 # space, which no `ulimit -v` admits. FAILING_READ is a library for LD_PRELOAD that makes
 # read(2) fail after $FAILING_READ_AFTER bytes; FEED_IN_PIECES runs a command on a non-blocking
 # pipe fed in pieces; CONFORMANCE_DIR holds the parsing test suite.
 set -uo pipefail
 jsonfmt=$1
-mode=$2
-failing_read=$3
-feed_in_pieces=$4
-conformance=$5
+man_page=$2
+mode=$3
+failing_read=$4
+feed_in_pieces=$5
+conformance=$6
 here=$(cd "$(dirname "$0")" && pwd)
+source "$here/support/missing.sh"
 work=$(mktemp -d)
 trap 'chmod -R u+w "$work"; rm -rf "$work"' EXIT
 # The read-only directory case runs as another user, who must reach the files.
@@ -22,6 +26,8 @@ failures=0
 pass() { echo "ok   $1"; passed=$((passed + 1)); }
 fail() { echo "FAIL $1"; failures=$((failures + 1)); }
 skip() { echo "skip $1"; }
+# absent NAME WHAT: a case that needs WHAT, which only scripts/install-deps.sh installs
+absent() { missing "$1: $2" || failures=$((failures + 1)); }
 # check NAME COMMAND...: a case that passes when COMMAND succeeds
 check() {
     local name=$1
@@ -94,7 +100,6 @@ expect missing-file 2 "" "jsonfmt: $work/none.json: No such file or directory" -
 expect bad-depth 2 "" "jsonfmt: --max-depth: needs a positive number (try --help)" -- --max-depth 0
 expect bad-depth-text 2 "" "jsonfmt: --max-depth: needs a positive number (try --help)" -- --max-depth x
 expect unknown-option 2 "" "jsonfmt: The following argument was not expected: --pretty (try --help)" -- --pretty
-expect version 0 "jsonfmt 0.1.0" "" -- --version
 
 # Layout: the common pretty text by default, its indentation chosen; the library's own text
 printf '{"e": "caf\xc3\xa9 \xf0\x9f\x98\x80", "n": [[]]}' >"$work/wide.json"
@@ -485,6 +490,8 @@ fi
 # a pipe. Release builds only: sanitizers and debug code are too slow and too large for it.
 if [ "$mode" = sanitized ]; then
     skip "stream-300MB: needs a release build"
+elif [ ! -x /usr/bin/time ]; then
+    absent stream-300MB "GNU time (/usr/bin/time, Debian package time)"
 else
     record='{"id": 1234567890123456789, "name": "user", "tags": [1.50, 2e400, "x"], "id": 1},'
     count=3700000
@@ -522,9 +529,9 @@ done
 
 # The manual page renders without warnings
 if command -v man >/dev/null; then
-    check man-page [ -z "$(man --warnings -l "$here/../tools/jsonfmt.1" 2>&1 >/dev/null)" ]
+    check man-page [ -z "$(man --warnings -l "$man_page" 2>&1 >/dev/null)" ]
 else
-    skip "man-page: man is not installed"
+    absent man-page "man (Debian package man-db)"
 fi
 
 echo "$passed passed, $failures failed"

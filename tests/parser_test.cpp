@@ -429,7 +429,6 @@ TEST(Parser, NumbersBecomeTheNearestDouble) {
     }
 }
 
-#ifdef JSON_DATA_DIR
 std::string read_file(const std::filesystem::path& path) {
     std::ifstream file(path, std::ios::binary);
     return {std::istreambuf_iterator<char>(file), {}};
@@ -439,12 +438,11 @@ std::string read_file(const std::filesystem::path& path) {
 // Accepted documents, and the benchmark documents, survive a write, compact and pretty, and a
 // second parse unchanged (canada.json: numbers of every magnitude).
 TEST(Parser, Conformance) {
-    const std::filesystem::path data = JSON_DATA_DIR;
+    const std::filesystem::path bench = JSON_BENCH_DATA_DIR;
     std::map<char, int> files;
     std::vector<std::filesystem::path> documents = {
-        data / "bench/twitter.json", data / "bench/citm_catalog.json", data / "bench/canada.json"};
-    for (const auto& entry :
-         std::filesystem::directory_iterator(data / "JSONTestSuite/test_parsing")) {
+        bench / "twitter.json", bench / "citm_catalog.json", bench / "canada.json"};
+    for (const auto& entry : std::filesystem::directory_iterator(JSON_TEST_PARSING_DIR)) {
         const char kind = entry.path().filename().string().front();
         ++files[kind];
         Value document;
@@ -476,7 +474,6 @@ TEST(Parser, Conformance) {
         }
     }
 }
-#endif
 
 // The texts with quotes, brackets and parentheses in them, and the ends of the table.
 TEST(ParseSupport, Descriptions) {

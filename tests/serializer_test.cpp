@@ -7,6 +7,7 @@
 #include <charconv>
 #include <clocale>
 #include <cmath>
+#include <cstdlib>
 #include <locale>
 #include <sstream>
 
@@ -218,9 +219,7 @@ class PipeNewlines : public std::ctype<char> {
     }
 };
 
-// Each newline is widened by the stream's locale and flushed, as std::endl does; the strings
-// of serialize and pretty_print are what a default std::ostringstream would hold. Numbers do
-// not depend on the locale.
+// Each newline is widened by the stream's locale and flushed, as std::endl does.
 TEST(Serializer, NewlinesAndStreams) {
     Recorder buffer;
     std::ostream out(&buffer);
@@ -237,8 +236,30 @@ TEST(Serializer, NewlinesAndStreams) {
     EXPECT_EQ(buffer.text, pretty + R"([1,[2]]{"k":[1,"v"]})");
     EXPECT_EQ(buffer.flushes.size(), 5u) << "compact text is never flushed";
 
-    // Under a global locale with a comma as its decimal separator, whose newline is '|'.
-    ASSERT_NE(std::setlocale(LC_ALL, "de_DE.UTF-8"), nullptr) << "scripts/install-deps.sh makes it";
+    std::ostringstream bad;
+    bad.setstate(ios_base::badbit);
+    Serializer().write(bad, Array{"text", 1});
+    EXPECT_EQ(bad.str(), "") << "a bad stream receives nothing";
+    buffer.broken = true;
+    out.exceptions(ios_base::badbit);
+    EXPECT_THROW(Serializer().write(out, Array{1}), ios_base::failure);
+}
+
+// Under global C and C++ locales with a comma as decimal separator, and a newline widened to
+// '|': the strings of serialize and pretty_print are what a default std::ostringstream would
+// hold, and numbers are written and read unchanged. The locale is made by the set-up script;
+// without it the test is skipped, unless JSONVALUE_REQUIRE_SETUP=1 (scripts/test.sh) asks for
+// everything the set-up makes.
+TEST(Serializer, UnderADecimalCommaLocale) {
+    if (std::setlocale(LC_ALL, "de_DE.UTF-8") == nullptr) {
+        const char* const missing = "the de_DE.UTF-8 locale is missing: scripts/install-deps.sh "
+                                    "(as root) makes it, or locale-gen de_DE.UTF-8";
+        const char* const require = std::getenv("JSONVALUE_REQUIRE_SETUP");
+        if (require != nullptr && std::string(require) == "1") {
+            FAIL() << missing;
+        }
+        GTEST_SKIP() << missing;
+    }
     const std::locale previous =
         std::locale::global(std::locale(std::locale("de_DE.UTF-8"), new PipeNewlines));
     const Value numbers = Array{0.5, -1.25e-3, 1e300, 1234567.875, 0.1f};
@@ -249,18 +270,10 @@ TEST(Serializer, NewlinesAndStreams) {
     const std::string in_string = pretty_print(Array{1, Object{}});
     std::locale::global(previous);
     std::setlocale(LC_ALL, "C");
-    EXPECT_EQ(in_string, pretty.substr(0, 21));
+    EXPECT_EQ(in_string, "[|    1,|    {    }|]");
     EXPECT_EQ(imbued.str(), "[0.5,-0.00125,1e+300,1234567.875,0.1]");
     EXPECT_EQ(result, ParseResult::SUCCESS);
     EXPECT_EQ(parsed, (Array{0.5, -1.25e-3, 1e300, 1234567.875, 0.1}));
-
-    std::ostringstream bad;
-    bad.setstate(ios_base::badbit);
-    Serializer().write(bad, Array{"text", 1});
-    EXPECT_EQ(bad.str(), "") << "a bad stream receives nothing";
-    buffer.broken = true;
-    out.exceptions(ios_base::badbit);
-    EXPECT_THROW(Serializer().write(out, Array{1}), ios_base::failure);
 }
 
 } // namespace

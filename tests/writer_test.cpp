@@ -100,10 +100,9 @@ TEST(Writer, EventsGiveTheTextOfSerialize) {
     expect_text_of_serialize(Array{std::string(40000, 'x'), Array(3000, 0.25)});
 }
 
-#ifdef JSON_DATA_DIR
 TEST(Writer, EventsGiveTheTextOfSerializeOnTheBenchDocuments) {
     for (const char* name : {"twitter", "citm_catalog", "canada"}) {
-        std::ifstream file(std::string(JSON_DATA_DIR) + "/bench/" + name + ".json");
+        std::ifstream file(std::string(JSON_BENCH_DATA_DIR) + "/" + name + ".json");
         std::ostringstream text;
         text << file.rdbuf();
         Value document;
@@ -115,7 +114,6 @@ TEST(Writer, EventsGiveTheTextOfSerializeOnTheBenchDocuments) {
         EXPECT_EQ(serialize(document, pretty), pretty_print(document));
     }
 }
-#endif
 
 // Indentation too long for the stream's buffer to take in one piece goes out in pieces.
 TEST(Writer, LongIndentationOntoAStream) {

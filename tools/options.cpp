@@ -2,6 +2,8 @@
 
 #include "diagnostics.hpp"
 
+#include <json/version.hpp>
+
 #include <CLI/CLI.hpp>
 
 #include <algorithm>
@@ -17,8 +19,6 @@
 namespace jsonfmt {
 
 namespace {
-
-constexpr const char* VERSION = "0.1.0";
 
 // What cannot be written as it was read is refused unless --lossy accepts it: bytes that are
 // not UTF-8 (copied as they are), unpaired surrogates (U+FFFD). Numbers and repeated member
@@ -177,7 +177,7 @@ std::optional<ExitStatus> read_arguments(int argc, char** argv, Settings& settin
     std::string max_depth;
     app.add_option("--max-depth", max_depth, "refuse nesting deeper than N (default 512)")
         ->type_name("N");
-    app.set_version_flag("--version", std::string("jsonfmt ") + VERSION,
+    app.set_version_flag("--version", std::string("jsonfmt ") + JSONVALUE_VERSION_STRING,
                          "show the version and exit");
     app.add_option("FILE", settings.files, "the documents to read")->type_name("");
     app.footer("Exit status: 0 when every document is valid, 1 when one is invalid or refused,\n"

@@ -2,7 +2,7 @@
 #define JSON_JSON_HPP
 
 // Everything jsonvalue offers: the value model, conversions, the builders, the writers
-// (from a document or from events) and parsing.
+// (from a document or from events), parsing, and the version macros.
 #include <json/builders.hpp>
 #include <json/convert.hpp>
 #include <json/events.hpp>
@@ -12,6 +12,7 @@
 #include <json/serializer.hpp>
 #include <json/text_conversion.hpp>
 #include <json/value.hpp>
+#include <json/version.hpp>
 #include <json/writer.hpp>
 
 #endif
