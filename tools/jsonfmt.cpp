@@ -4,8 +4,10 @@
 // order, repeated names and number literals come out as they came in.
 #include "descriptor_input.hpp"
 #include "diagnostics.hpp"
+#include "document_modes.hpp"
 #include "file_output.hpp"
 #include "key_sorter.hpp"
+#include "merge_patch_filter.hpp"
 #include "pointer_filter.hpp"
 
 #include <json/json.hpp>
@@ -58,6 +60,8 @@ struct Settings {
     json::ParseOptions parse_options;
     json::WriteOptions write_options;
     std::vector<std::string> files;
+    jsonfmt::PatchOptions patches;
+    std::optional<json::Value> merge_patch; // --merge-patch, read
 };
 
 void complain(const std::string& message) {
@@ -258,8 +262,13 @@ ExitStatus format_source(Source& source, const std::string& name, std::size_t li
                          const Settings& settings, Output& output) {
     json::ParseOptions options = settings.parse_options;
     options.allow_comments = options.allow_comments && !comments_must_survive(settings);
-    const DocumentResult result =
-        output.document([&](auto& handler) { return source.parse(handler, options); });
+    std::string unmergeable; // why --merge-patch stopped the parse
+    const DocumentResult result = output.document([&](auto& handler) {
+        const auto parse = [&](auto& first) { return source.parse(first, options); };
+        return settings.merge_patch
+                   ? jsonfmt::parse_merged(*settings.merge_patch, handler, parse, unmergeable)
+                   : parse(handler);
+    });
     if (result.written()) {
         return VALID;
     }
@@ -269,6 +278,8 @@ ExitStatus format_source(Source& source, const std::string& name, std::size_t li
     if (source.error() != 0) {
         complain(name + ": " + std::strerror(source.error()));
         status = TROUBLE;
+    } else if (!result.report && !unmergeable.empty()) {
+        report_located(source, name, std::max<std::size_t>(line, 1), result.report, unmergeable);
     } else if (!result.report) {
         report_parse_failure(source, name, std::max<std::size_t>(line, 1), result.report, settings);
     } else if (!result.unwritable.empty()) {
@@ -521,6 +532,7 @@ bool read_arguments(int argc, char** argv, Settings& settings, int& status) {
     app.add_option("-o,--output", settings.output_path, "write to FILE, not standard output")
         ->type_name("FILE");
     app.add_flag("-i,--in-place", settings.in_place, "rewrite each FILE with its formatted text");
+    jsonfmt::add_patch_options(app, settings.patches);
     app.add_option("--max-depth", settings.parse_options.max_depth,
                    "refuse nesting deeper than N (default 512)")
         ->type_name("N")
@@ -536,8 +548,9 @@ bool read_arguments(int argc, char** argv, Settings& settings, int& status) {
                          "show the version and exit");
     app.add_option("FILE", settings.files, "the documents to read")->type_name("");
     app.footer("Exit status: 0 when every document is valid, 1 when one is invalid or refused,\n"
-               "a pointer finds nothing or --ascii cannot write it, 2 for usage errors, I/O\n"
-               "errors and running out of memory.");
+               "a pointer finds nothing, --ascii cannot write it or a patch fails on it, 2 for\n"
+               "usage errors, I/O errors and running out of memory. --diff and --merge-diff:\n"
+               "0 when the documents are equal, 1 when they differ, 2 for any trouble.");
     try {
         app.parse(argc, argv);
     } catch (const CLI::CallForHelp&) {
@@ -563,6 +576,10 @@ bool read_arguments(int argc, char** argv, Settings& settings, int& status) {
             usage_error = std::string("--pointer: ") + error.what();
         }
     }
+    if (std::string refused = jsonfmt::patch_usage_error(settings.patches, settings.files);
+        !refused.empty()) {
+        usage_error = std::move(refused);
+    }
     if (settings.files.empty()) {
         settings.files.emplace_back("-");
     }
@@ -585,11 +602,22 @@ bool read_arguments(int argc, char** argv, Settings& settings, int& status) {
         status = TROUBLE;
         return true;
     }
+    if (!settings.patches.merge_patch.empty() &&
+        !jsonfmt::read_patch(settings.patches.merge_patch, settings.merge_patch.emplace())) {
+        status = TROUBLE;
+        return true;
+    }
     return false;
 }
 
 int run(const Settings& settings) {
     using Target = jsonfmt::Replacement::Target;
+    if (settings.patches.builds_documents()) {
+        return jsonfmt::run_document_mode(
+            {settings.patches, settings.files, settings.parse_options, settings.write_options,
+             settings.pointer ? &*settings.pointer : nullptr, settings.output_path,
+             settings.in_place, settings.check_only, settings.lossy});
+    }
     if (settings.in_place) {
         ExitStatus status = VALID;
         for (const std::string& name : settings.files) {
