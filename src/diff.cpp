@@ -15,16 +15,13 @@ namespace {
 
 class Differ {
   public:
-    Differ(const Value& source, const Value& target) { compare(source, target); }
+    Differ(const Value& source, const Value& target) { compare(source, target, nullptr); }
 
     // Walks the containers opened until none is left.
     void run() {
         while (!open.empty()) {
             if (!walk(open.size() - 1)) {
                 open.pop_back();
-                if (!open.empty()) {
-                    path.pop_back(); // the token of the container just walked
-                }
             }
         }
     }
@@ -40,53 +37,74 @@ class Differ {
     }
 
   private:
-    // Two containers of one kind being compared: how far their elements or members are.
+    // A step of a path: a member name, or an element's index when there is no name. Paths are
+    // written only for operations, from the steps of the open containers.
+    struct Token {
+        const std::string* name;
+        std::size_t index;
+    };
+
+    // Two containers of one kind being compared, the step to them from the ones before, and how
+    // far their elements or members are.
     struct Open {
         const Value* source;
         const Value* target;
+        Token token;
         std::size_t index = 0; // arrays
         Object::const_iterator source_member{};
         Object::const_iterator target_member{};
     };
 
-    // Compares the values at `path`: two containers of one kind are opened, to be walked;
-    // anything else that differs is replaced. Returns whether a container was opened.
-    bool compare(const Value& source, const Value& target) {
+    // Compares the values at `token` in the innermost open containers (at the top when null):
+    // two containers of one kind are opened, to be walked; anything else that differs is
+    // replaced. Returns whether a container was opened.
+    [[gnu::always_inline]] bool compare(const Value& source, const Value& target,
+                                        const Token* token) {
         if (source.which() == target.which() && (source.is_array() || source.is_object())) {
-            Open pair{&source, &target};
+            Open pair{&source, &target, token == nullptr ? Token{} : *token};
             if (source.is_object()) {
-                pair.source_member = source.as_object().begin();
-                pair.target_member = target.as_object().begin();
+                pair.source_member = boost::get<Object>(source).begin();
+                pair.target_member = boost::get<Object>(target).begin();
             }
             open.push_back(pair);
             return true;
         }
-        if (source != target) {
-            add_operation("replace", &target);
+        if (differ(source, target)) {
+            add_operation("replace", token, &target);
         }
         return false;
     }
 
-    // Compares the children under `token`; returns whether a container was opened, which
-    // keeps the token on the path until it has been walked.
-    template <typename Token>
-    bool compare_child(const Token& token, const Value& source, const Value& target) {
-        path.push_back(token);
-        const bool opened = compare(source, target);
-        if (!opened) {
-            path.pop_back();
+    // operator!= for values that are not containers of one kind, with the leaves most
+    // documents are made of compared inline. (Here and below boost::get, inline, rather than
+    // the library's own checked accessors: the kinds are known.)
+    [[gnu::always_inline]] static bool differ(const Value& source, const Value& target) {
+        if (source.which() == target.which() && source.which() == detail::DOUBLE_INDEX) {
+            return boost::get<double>(source) != boost::get<double>(target);
         }
-        return opened;
+        if (source.which() == target.which() && source.is_string()) {
+            return boost::get<std::string>(source) != boost::get<std::string>(target);
+        }
+        return source != target;
     }
 
-    template <typename Token>
-    void add_operation_at(const char* op, const Token& token, const Value* value) {
-        path.push_back(token);
-        add_operation(op, value);
-        path.pop_back();
+    static void append(Pointer& path, const Token& token) {
+        if (token.name != nullptr) {
+            path.push_back(*token.name);
+        } else {
+            path.push_back(token.index);
+        }
     }
 
-    void add_operation(const char* op, const Value* value) {
+    // An operation at `token` in the innermost open containers (at the top when null).
+    void add_operation(const char* op, const Token* token, const Value* value) {
+        Pointer path;
+        for (std::size_t at = 1; at < open.size(); ++at) {
+            append(path, open[at].token);
+        }
+        if (token != nullptr) {
+            append(path, *token);
+        }
         Object operation;
         operation.emplace("op", op);
         operation.emplace("path", path.text());
@@ -104,28 +122,30 @@ class Differ {
     }
 
     bool walk_array(std::size_t at) {
-        const Array& source = open[at].source->as_array();
-        const Array& target = open[at].target->as_array();
+        const auto& source = boost::get<Array>(*open[at].source);
+        const auto& target = boost::get<Array>(*open[at].target);
         const std::size_t common = std::min(source.size(), target.size());
         while (open[at].index < common) {
-            const std::size_t index = open[at].index++;
-            if (compare_child(index, source[index], target[index])) {
+            const Token token{nullptr, open[at].index++};
+            if (compare(source[token.index], target[token.index], &token)) {
                 return true;
             }
         }
         for (std::size_t index = common; index < target.size(); ++index) {
-            add_operation_at("add", index, &target[index]);
+            const Token token{nullptr, index};
+            add_operation("add", &token, &target[index]);
         }
         for (std::size_t index = source.size(); index > common; --index) {
-            add_operation_at("remove", index - 1, nullptr);
+            const Token token{nullptr, index - 1};
+            add_operation("remove", &token, nullptr);
         }
         return false;
     }
 
     // Both objects' members in key order at once; a member holding Undefined is absent.
     bool walk_object(std::size_t at) {
-        const Object& source = open[at].source->as_object();
-        const Object& target = open[at].target->as_object();
+        const auto& source = boost::get<Object>(*open[at].source);
+        const auto& target = boost::get<Object>(*open[at].target);
         auto from = open[at].source_member;
         auto to = open[at].target_member;
         for (;;) {
@@ -139,15 +159,18 @@ class Differ {
                 return false;
             }
             if (to == target.end() || (from != source.end() && from->first < to->first)) {
-                add_operation_at("remove", from->first, nullptr);
+                const Token token{&from->first, 0};
+                add_operation("remove", &token, nullptr);
                 ++from;
             } else if (from == source.end() || to->first < from->first) {
-                add_operation_at("add", to->first, &to->second);
+                const Token token{&to->first, 0};
+                add_operation("add", &token, &to->second);
                 ++to;
             } else {
                 open[at].source_member = std::next(from);
                 open[at].target_member = std::next(to);
-                if (compare_child(from->first, from->second, to->second)) {
+                const Token token{&from->first, 0};
+                if (compare(from->second, to->second, &token)) {
                     return true;
                 }
                 ++from;
@@ -157,7 +180,6 @@ class Differ {
     }
 
     std::vector<Open> open; // the containers being walked, innermost last
-    Pointer path;           // where the innermost comparison stands
     std::vector<Object> made;
 };
 
