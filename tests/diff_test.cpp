@@ -189,9 +189,9 @@ TEST(Diff, RoundTripsOverTheBenchmarkDocumentsWithRandomEdits) {
         const Value original = parsed(text.str());
         ASSERT_TRUE(original.is_object()) << name;
         EXPECT_EQ(json::diff(original, original), Array{}) << name;
-        for (unsigned seed = 1; seed <= 4; ++seed) {
+        for (unsigned seed = 1; seed <= 3; ++seed) {
             Value edited = original;
-            Editor(seed).edit(edited, static_cast<int>(5 * seed));
+            Editor(seed).edit(edited, static_cast<int>(4 * seed));
             ASSERT_FALSE(edited == original) << name << " seed " << seed;
             expect_round_trips(original, edited, name + (" seed " + std::to_string(seed)));
         }

@@ -101,7 +101,7 @@ check patch-output-content [ "$(cat "$work/kept.json")" = "$scaled" ]
 # --merge-patch streams: members it replaces or removes where they stand, members it adds at the
 # end of their object, everything else as it came (order, literals, repeated names)
 put config.json '{"z": 1e400, "name": "web", "limits": {"cpu": 1.50, "memory": "1G", "cpu": 2}, "env": ["A"], "old": {"x": 1}, "id": 12345678901234567890}'
-put change.json '{"name": "api", "limits": {"memory": "2G", "disk": {"size": 10, "none": null}}, "env": {"B": "1"}, "old": null, "new": [null, 1]}'
+put change.json '{"name": "api", "limits": {"memory": "2G", "disk": {"size": 10, "none": null}}, "env": {"B": "1"}, "old": null, "absent": null, "new": [null, 1]}'
 merged='{"z":1e400,"name":"api","limits":{"cpu":1.50,"memory":"2G","cpu":2,"disk":{"size":10}},"env":{"B":"1"},"id":12345678901234567890,"new":[null,1]}'
 expect merge-patch 0 "$merged" "" -c --merge-patch change.json config.json
 expect merge-patch-check 0 "" "" --check --merge-patch change.json config.json
