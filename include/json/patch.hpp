@@ -40,9 +40,10 @@ struct PatchReport {
 /// logarithmic look-up per object on the way), a copy of its "value" or of the value at
 /// "from" for copy, and for an element added to or removed from an array the length of that
 /// array: its elements are moved over by swapping, with one small allocation per element
-/// that is an array or object when the array has no room left or its elements differ in
-/// kind. What an operation replaces or removes is kept until the patch is through, so that a
-/// failure puts it back without copying or allocating anything.
+/// that is an array or object when the array has no room left, its elements differ in kind,
+/// or the element removed is itself an array or object. What an operation replaces or removes
+/// is kept until the patch is through, so that a failure puts it back without copying or
+/// allocating anything.
 ///
 /// `patch` must not lie inside `document`. Throws only std::bad_alloc, and then too
 /// `document` is as it was, with one exception: when the patch turns a top-level array into
