@@ -123,6 +123,17 @@ const Value* Pointer::find(const Value& root, std::size_t count) const noexcept 
     return find(const_cast<Value&>(root), count);
 }
 
+std::size_t Pointer::found_steps(const Value& root, std::size_t count) const noexcept {
+    Value* current = const_cast<Value*>(&root);
+    for (std::size_t step = 0; step < count; ++step) {
+        current = child(*current, step);
+        if (current == nullptr) {
+            return step;
+        }
+    }
+    return count;
+}
+
 Value* Pointer::find(Value& root) const noexcept {
     return find(root, size());
 }
@@ -160,7 +171,11 @@ std::string Pointer::why_missing(std::size_t step, Kind parent, std::size_t elem
         return std::string("expected JSON object or array, found ") + kind_name(parent);
     }
     if (index(step) == NOT_AN_INDEX) {
-        return "\"" + std::string(token(step)) + "\" is no index of a " + kind_name(Kind::ARRAY);
+        // Digits that are no index can only have a leading zero.
+        const bool digits = !token(step).empty() &&
+                            token(step).find_first_not_of("0123456789") == std::string_view::npos;
+        return "\"" + std::string(token(step)) + "\" is no index of a " + kind_name(Kind::ARRAY) +
+               (digits ? ": it has a leading zero" : "");
     }
     return detail::index_out_of_range(token(step), elements);
 }

@@ -186,7 +186,7 @@ expect pointer-bad-escape 2 "" "jsonfmt: --pointer: JSON Pointer \"/a~2\" has a 
 printf '{"a": {"y": 1}, "b": [1, 2], "c": "s", "d": [{"e": 1}, {"e": 2}], "f": 0, "f": {"g": 1}, "~/": 5}' >"$work/path.json"
 for miss in '/a/x|no value at /a/x: no member "x"' '/b/5|no value at /b/5: index 5 out of range for a JSON array of 2 elements' \
     '/b/x|no value at /b/x: "x" is no index of a JSON array' '/b/-|no value at /b/-: "-" is no index of a JSON array' \
-    '/b/01|no value at /b/01: "01" is no index of a JSON array' '/c/d|no value at /c/d: expected JSON object or array, found JSON string' \
+    '/b/01|no value at /b/01: "01" is no index of a JSON array: it has a leading zero' '/c/d|no value at /c/d: expected JSON object or array, found JSON string' \
     '/f/g|no single value at /f: the object has more than one member "f"' \
     '/b/99999999999999999999999|no value at /b/99999999999999999999999: index 99999999999999999999999 out of range for a JSON array of 2 elements'; do
     expect "pointer-miss ${miss%%|*}" 1 "" "$work/path.json: ${miss#*|}" -- -c -p "${miss%%|*}" "$work/path.json"

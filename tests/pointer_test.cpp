@@ -45,7 +45,7 @@ TEST(Pointer, ResolvesEveryPointerOfTheRfcExample) {
         {"/bar", "/bar: no member \"bar\""},
         {"/foo/2", "/foo/2: index 2 out of range for a JSON array of 2 elements"},
         {"/foo/-", "/foo/-: \"-\" is no index of a JSON array"},
-        {"/foo/01", "/foo/01: \"01\" is no index of a JSON array"},
+        {"/foo/01", "/foo/01: \"01\" is no index of a JSON array: it has a leading zero"},
         {"/foo/0/x/y", "/foo/0/x: expected JSON object or array, found JSON string"},
         {"/foo/18446744073709551614",
          "/foo/18446744073709551614: index 18446744073709551614 out of range for a JSON array "

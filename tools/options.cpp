@@ -174,6 +174,7 @@ std::optional<ExitStatus> read_arguments(int argc, char** argv, Settings& settin
     app.add_option("-o,--output", settings.output_path, "write to FILE, not standard output")
         ->type_name("FILE");
     app.add_flag("-i,--in-place", settings.in_place, "rewrite each FILE with its formatted text");
+    add_patch_options(app, settings.patches);
     std::string max_depth;
     app.add_option("--max-depth", max_depth, "refuse nesting deeper than N (default 512)")
         ->type_name("N");
@@ -181,8 +182,9 @@ std::optional<ExitStatus> read_arguments(int argc, char** argv, Settings& settin
                          "show the version and exit");
     app.add_option("FILE", settings.files, "the documents to read")->type_name("");
     app.footer("Exit status: 0 when every document is valid, 1 when one is invalid or refused,\n"
-               "a pointer finds nothing or --ascii cannot write it, 2 for usage errors, I/O\n"
-               "errors and running out of memory.");
+               "a pointer finds nothing, --ascii cannot write it or a patch fails on it, 2 for\n"
+               "usage errors, I/O errors and running out of memory. --diff and --merge-diff:\n"
+               "0 when the documents are equal, 1 when they differ, 2 for any trouble.");
     try {
         app.parse(argc, argv);
     } catch (const CLI::CallForHelp&) {
@@ -197,6 +199,7 @@ std::optional<ExitStatus> read_arguments(int argc, char** argv, Settings& settin
     }
     settings.write_options = chosen_layout(settings.layout, settings.lines);
     choose_leniency(settings);
+    const std::vector<std::string> given_files = settings.files;
     if (settings.files.empty()) {
         settings.files.emplace_back("-");
     }
@@ -212,10 +215,17 @@ std::optional<ExitStatus> read_arguments(int argc, char** argv, Settings& settin
         }
     }
     if (problem.empty()) {
+        problem = patch_usage_error(settings.patches, given_files);
+    }
+    if (problem.empty()) {
         problem = usage_problem(settings);
     }
     if (!problem.empty()) {
         complain(problem + " (try --help)");
+        return TROUBLE;
+    }
+    if (!settings.patches.merge_patch.empty() &&
+        !read_patch(settings.patches.merge_patch, settings.merge_patch.emplace())) {
         return TROUBLE;
     }
     return std::nullopt;

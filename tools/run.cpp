@@ -3,6 +3,7 @@
 #include "diagnostics.hpp"
 #include "file_output.hpp"
 #include "line_reader.hpp"
+#include "merge_patch_filter.hpp"
 #include "output.hpp"
 #include "sources.hpp"
 
@@ -64,8 +65,13 @@ ExitStatus format_source(Source& source, const std::string& name, std::size_t li
         options.allow_comments = false;
         options.allow_bom = false;
     }
-    const DocumentResult result =
-        output.document([&](auto& handler) { return source.parse(handler, options); });
+    std::string unmergeable; // why --merge-patch stopped the parse
+    const DocumentResult result = output.document([&](auto& handler) {
+        const auto parse = [&](auto& first) { return source.parse(first, options); };
+        return settings.merge_patch
+                   ? parse_merged(*settings.merge_patch, handler, parse, unmergeable)
+                   : parse(handler);
+    });
     if (result.written()) {
         return VALID;
     }
@@ -78,6 +84,8 @@ ExitStatus format_source(Source& source, const std::string& name, std::size_t li
     } else if (source.read_error() != 0) {
         complain(where + ": read failed: " + std::strerror(source.read_error()));
         status = TROUBLE;
+    } else if (!result.report && !unmergeable.empty()) {
+        report_located(source, name, std::max<std::size_t>(line, 1), result.report, unmergeable);
     } else if (!result.report) {
         report_parse_failure(source, name, std::max<std::size_t>(line, 1), result.report, settings);
     } else if (!result.unwritable.empty()) {
@@ -200,6 +208,12 @@ ExitStatus write_special_file(const std::string& name, const Settings& settings)
 
 ExitStatus run(const Settings& settings) {
     using Target = Replacement::Target;
+    if (settings.patches.builds_documents()) {
+        return static_cast<ExitStatus>(run_document_mode(
+            {settings.patches, settings.files, settings.parse_options, settings.write_options,
+             settings.pointer ? &*settings.pointer : nullptr, settings.output_path,
+             settings.in_place, settings.check_only, settings.lossy}));
+    }
     if (settings.in_place) {
         ExitStatus status = VALID;
         for (const std::string& name : settings.files) {

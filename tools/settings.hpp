@@ -3,9 +3,12 @@
 
 // What a jsonfmt run was asked to do, as its command line said it.
 
+#include "document_modes.hpp"
+
 #include <json/parse_options.hpp>
 #include <json/pointer.hpp>
 #include <json/serializer.hpp>
+#include <json/value.hpp>
 
 #include <optional>
 #include <string>
@@ -37,6 +40,8 @@ struct Settings {
     json::ParseOptions parse_options;
     json::WriteOptions write_options;
     std::vector<std::string> files;
+    PatchOptions patches;
+    std::optional<json::Value> merge_patch; // --merge-patch, read
 };
 
 /// Whether --in-place must refuse what its rewrite would drop: a comment or a byte order mark

@@ -2,12 +2,13 @@
 #define JSON_JSON_HPP
 
 // Everything jsonvalue offers: the value model, conversions, the builders, the writers
-// (from a document or from events), parsing, and the version macros.
+// (from a document or from events), parsing, patches, and the version macros.
 #include <json/builders.hpp>
 #include <json/convert.hpp>
 #include <json/events.hpp>
 #include <json/parse.hpp>
 #include <json/parse_options.hpp>
+#include <json/patch.hpp>
 #include <json/pointer.hpp>
 #include <json/serializer.hpp>
 #include <json/text_conversion.hpp>

@@ -74,6 +74,10 @@ class JSONVALUE_API Pointer {
     Value* find(Value& root, std::size_t count) const noexcept;
     /// @copydoc find(Value&, std::size_t) const
     const Value* find(const Value& root, std::size_t count) const noexcept;
+    /// How many of the first `count` tokens lead somewhere in `root`: `count` when
+    /// find(root, count) finds a value, otherwise the first token that finds nothing, whose
+    /// parent is find(root, result) and why_missing(result, parent) says why. Throws nothing.
+    std::size_t found_steps(const Value& root, std::size_t count) const noexcept;
 
     /// The value this pointer refers to in `root`. Throws std::out_of_range when there is none,
     /// with a message that begins with the pointer up to the first token not found, followed by
@@ -84,8 +88,9 @@ class JSONVALUE_API Pointer {
 
     /// Why token `step` finds nothing in `parent`, the value the tokens before it lead to:
     /// "no member \"a\"", "index 3 out of range for a JSON array of 2 elements", "\"x\" is no
-    /// index of a JSON array", or "expected JSON object or array, found JSON string". Linear
-    /// in the length of the token. Throws std::bad_alloc.
+    /// index of a JSON array", "\"01\" is no index of a JSON array: it has a leading zero", or
+    /// "expected JSON object or array, found JSON string". Linear in the length of the token.
+    /// Throws std::bad_alloc.
     std::string why_missing(std::size_t step, const Value& parent) const;
     /// The same from what a reader of parsing events knows of the parent: its kind and, for
     /// an array, how many elements it has.

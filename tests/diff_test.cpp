@@ -1,0 +1,218 @@
+// diff: the patch it writes for small pairs, and the round trip apply_patch(source, diff(source,
+// target)) == target (and the same with merge_diff) over the benchmark documents with seeded
+// random edits, and over documents nested far deeper than any call stack allows.
+#include <json/json.hpp>
+
+#include <gtest/gtest.h>
+
+#include <fstream>
+#include <random>
+#include <sstream>
+#include <string>
+#include <vector>
+
+namespace {
+
+using json::Array;
+using json::Object;
+using json::Value;
+
+Value parsed(const std::string& text, const json::ParseOptions& options = {}) {
+    Value out;
+    EXPECT_TRUE(json::parse(text, out, options)) << text.substr(0, 80);
+    return out;
+}
+
+// The patch either way turns one into the other.
+void expect_round_trip(const Value& source, const Value& target, const std::string& what) {
+    for (const bool forward : {true, false}) {
+        const Value& from = forward ? source : target;
+        const Value& to = forward ? target : source;
+        Value patched = from;
+        const Value patch = json::diff(from, to);
+        const json::PatchReport report = json::apply_patch(patched, patch);
+        ASSERT_TRUE(report) << what << ": " << report.message;
+        EXPECT_TRUE(patched == to) << what << (forward ? "" : ", backwards");
+    }
+}
+
+// The same, and the merge patch from source to target does it too (target has no member
+// that became null).
+void expect_round_trips(const Value& source, const Value& target, const std::string& what) {
+    expect_round_trip(source, target, what);
+    Value merged = source;
+    json::apply_merge_patch(merged, json::merge_diff(source, target));
+    EXPECT_TRUE(merged == target) << what << ", merge patch";
+}
+
+TEST(Diff, WritesAReadablePatch) {
+    const struct {
+        const char* source;
+        const char* target;
+        const char* patch;
+    } rows[] = {
+        {R"({"a":1,"b":[1,2,3],"c":{"d":"x"}})", R"({"b":[1,5],"c":{"d":"x","e":null},"f":true})",
+         R"([{"op":"remove","path":"/a"},{"op":"replace","path":"/b/1","value":5},)"
+         R"({"op":"remove","path":"/b/2"},{"op":"add","path":"/c/e","value":null},)"
+         R"({"op":"add","path":"/f","value":true}])"},
+        {R"({"a":[1,{"b":2}]})", R"({"a":[1,{"b":2}]})", "[]"},
+        {"[1]", R"({"a":1})", R"([{"op":"replace","path":"","value":{"a":1}}])"},
+        {R"([1,"1",null])", R"([1.0,"1",false])",
+         R"([{"op":"replace","path":"/2","value":false}])"},
+        {R"({"a/b":{"~":1}})", R"({"a/b":{"~":2}})",
+         R"([{"op":"replace","path":"/a~1b/~0","value":2}])"},
+        {"[[1],3]", "[[1,2,3],3,[4]]",
+         R"([{"op":"add","path":"/0/1","value":2},{"op":"add","path":"/0/2","value":3},)"
+         R"({"op":"add","path":"/2","value":[4]}])"},
+        {"[1,2,3,4]", "[0,2]",
+         R"([{"op":"replace","path":"/0","value":0},{"op":"remove","path":"/3"},)"
+         R"({"op":"remove","path":"/2"}])"},
+        {R"({"a":{"b":[]}})", R"({"a":[{"b":[]}]})",
+         R"([{"op":"replace","path":"/a","value":[{"b":[]}]}])"},
+    };
+    json::WriteOptions plain_slash;
+    plain_slash.escape_slash = false;
+    for (const auto& row : rows) {
+        const Value source = parsed(row.source), target = parsed(row.target);
+        EXPECT_EQ(json::serialize(json::diff(source, target), plain_slash), row.patch)
+            << row.source;
+        expect_round_trip(source, target, row.source);
+    }
+}
+
+// A member holding Undefined is no member: nothing to remove, nothing to add.
+TEST(Diff, TakesMembersHoldingUndefinedForAbsent) {
+    const Value source = Object{{"a", Value()}, {"b", 1}};
+    const Value target = Object{{"b", 1}, {"c", Value()}};
+    EXPECT_EQ(json::diff(source, target), Array{});
+    EXPECT_EQ(json::merge_diff(source, target), Object{});
+}
+
+// Seeded random edits of a document: scalars changed, members and elements added and removed,
+// values replaced by others of another kind. What is put in holds no null, so that the merge
+// patch expresses it too.
+class Editor {
+  public:
+    explicit Editor(unsigned seed) : random(seed) {}
+
+    void edit(Value& document, int edits) {
+        for (int i = 0; i < edits; ++i) {
+            std::vector<Value*> values{&document};
+            for (std::size_t at = 0; at < values.size(); ++at) {
+                add_children(*values[at], values);
+            }
+            edit_one(*values[pick(values.size())]);
+        }
+    }
+
+  private:
+    static void add_children(Value& value, std::vector<Value*>& values) {
+        if (value.is_array()) {
+            for (Value& element : value.as_array()) {
+                values.push_back(&element);
+            }
+        } else if (value.is_object()) {
+            for (auto& member : value.as_object()) {
+                values.push_back(&member.second);
+            }
+        }
+    }
+
+    std::size_t pick(std::size_t count) {
+        return std::uniform_int_distribution<std::size_t>(0, count - 1)(random);
+    }
+
+    Value fresh() {
+        switch (pick(6)) {
+        case 0:
+            return static_cast<double>(pick(1000)) / 8;
+        case 1:
+            return "text " + std::to_string(pick(100));
+        case 2:
+            return pick(2) == 0;
+        case 3:
+            return Array{1, pick(10), "x"};
+        case 4:
+            return Object{{"n", pick(10)}, {"list", Array{}}};
+        default:
+            return Object{};
+        }
+    }
+
+    // A scalar or string changes; in a container, a member or element is added, removed or
+    // replaced by another value.
+    void edit_one(Value& value) {
+        if (value.is_object() && !value.as_object().empty()) {
+            Object& members = value.as_object();
+            auto member =
+                std::next(members.begin(), static_cast<std::ptrdiff_t>(pick(members.size())));
+            switch (pick(3)) {
+            case 0:
+                members.emplace("new " + std::to_string(pick(1000)), fresh());
+                break;
+            case 1:
+                members.erase(member);
+                break;
+            default:
+                member->second = fresh();
+            }
+        } else if (value.is_array() && !value.as_array().empty()) {
+            Array& elements = value.as_array();
+            const auto at = elements.begin() + static_cast<std::ptrdiff_t>(pick(elements.size()));
+            switch (pick(3)) {
+            case 0:
+                elements.insert(at, fresh());
+                break;
+            case 1:
+                elements.erase(at);
+                break;
+            default:
+                *at = fresh();
+            }
+        } else {
+            value = fresh();
+        }
+    }
+
+    std::mt19937 random;
+};
+
+TEST(Diff, RoundTripsOverTheBenchmarkDocumentsWithRandomEdits) {
+    for (const char* name : {"twitter", "citm_catalog", "canada"}) {
+        std::ifstream file(std::string(JSON_BENCH_DATA_DIR) + "/" + name + ".json");
+        std::ostringstream text;
+        text << file.rdbuf();
+        // twitter.json has integers beyond 2^53: rounded, as the default options do.
+        const Value original = parsed(text.str());
+        ASSERT_TRUE(original.is_object()) << name;
+        EXPECT_EQ(json::diff(original, original), Array{}) << name;
+        for (unsigned seed = 1; seed <= 3; ++seed) {
+            Value edited = original;
+            Editor(seed).edit(edited, static_cast<int>(4 * seed));
+            ASSERT_FALSE(edited == original) << name << " seed " << seed;
+            expect_round_trips(original, edited, name + (" seed " + std::to_string(seed)));
+        }
+    }
+}
+
+// 100000 levels: nothing here recurses once per level.
+TEST(Diff, WorksOnDocumentsOfAnyDepth) {
+    constexpr std::size_t depth = 100000;
+    json::ParseOptions deep;
+    deep.max_depth = depth + 1;
+    std::string objects;
+    for (std::size_t i = 0; i < depth; ++i) {
+        objects += R"({"a":)";
+    }
+    const Value arrays_1 = parsed(std::string(depth, '[') + "1" + std::string(depth, ']'), deep);
+    const Value arrays_2 = parsed(std::string(depth, '[') + "2" + std::string(depth, ']'), deep);
+    const Value objects_1 = parsed(objects + "1" + std::string(depth, '}'), deep);
+    const Value objects_2 = parsed(objects + R"({"b":2})" + std::string(depth, '}'), deep);
+    const Value patch = json::diff(arrays_1, arrays_2);
+    ASSERT_EQ(patch.as_array().size(), 1u);
+    EXPECT_EQ(patch.as_array()[0].at("path").as_string().size(), 2 * depth);
+    expect_round_trips(arrays_1, arrays_2, "arrays");
+    expect_round_trips(objects_1, objects_2, "objects");
+}
+
+} // namespace
