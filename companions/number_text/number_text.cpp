@@ -44,7 +44,7 @@ int decimal_digit_count(std::uint64_t integer) {
     const std::uint64_t odd = integer | 1U;
     const int bits = std::numeric_limits<std::uint64_t>::digits - __builtin_clzll(odd);
     const int guess = (bits * 1233) >> 12U;
-    return guess + (odd >= INTEGER_POWERS_OF_TEN.at(static_cast<std::size_t>(guess)) ? 1 : 0);
+    return guess + (odd >= INTEGER_POWERS_OF_TEN[static_cast<std::size_t>(guess)] ? 1 : 0);
 }
 
 // The eight digits of `digits` (below 10^8), leading zeros too, as the characters of a
@@ -220,11 +220,11 @@ char* write_short_fraction(char* out, Number magnitude) {
     const auto& scales = FRACTION_SCALES<Number>;
     const auto row =
         static_cast<std::size_t>(binary_exponent(magnitude) - LOWEST_FRACTION_EXPONENT);
-    if (row >= scales.size() || scales.at(row) == 0) {
+    if (row >= scales.size() || scales[row] == 0) {
         return nullptr; // no room for a fractional digit
     }
-    const std::size_t scale = scales.at(row);
-    const auto power = static_cast<Number>(POWERS_OF_TEN.at(scale));
+    const std::size_t scale = scales[row];
+    const auto power = static_cast<Number>(POWERS_OF_TEN[scale]);
     const Number scaled = magnitude * power;
     // Adding one half is exact below 2^(digits - 3); the conversion truncates.
     auto digits = static_cast<std::uint64_t>(scaled + static_cast<Number>(0.5));
@@ -256,7 +256,7 @@ char* write_short_fraction(char* out, Number magnitude) {
     // 10^-k at this scale): the two have the same integral part, and the conversion truncates
     // to it.
     const auto integral = static_cast<std::uint64_t>(magnitude);
-    return write_fixed(out, integral, digits - integral * INTEGER_POWERS_OF_TEN.at(fraction_length),
+    return write_fixed(out, integral, digits - integral * INTEGER_POWERS_OF_TEN[fraction_length],
                        static_cast<int>(fraction_length));
 }
 
@@ -300,7 +300,7 @@ char* write_shortest_decimal(char* out, Number magnitude) {
         integral == 0
             ? significand
             : significand -
-                  integral * INTEGER_POWERS_OF_TEN.at(static_cast<std::size_t>(fraction_length));
+                  integral * INTEGER_POWERS_OF_TEN[static_cast<std::size_t>(fraction_length)];
     return write_fixed(out, integral, fraction, fraction_length);
 }
 
