@@ -72,7 +72,7 @@ void store_last(char* out, std::uint64_t text, int count) {
 // Writes the last `count` (1 to 20) decimal digits of `value`, leading zeros too, and returns
 // their end. The digits are computed eight at a time and stored eight bytes at a time, straight
 // into place: up to seven bytes past the end are written too, which what follows overwrites or
-// the terminator ends. Never read back, those stores cost no wait for the loads that follow.
+// the terminator ends (the longest text, 24 characters, leaves room for them in 80 bytes).
 char* write_digits(char* out, std::uint64_t value, int count) {
     constexpr std::uint64_t eight_digits = 100'000'000;
     char* const end = out + count;
