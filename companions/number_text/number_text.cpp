@@ -1,5 +1,7 @@
 #include "number_text.hpp"
 
+#include "decimal_digits.hpp"
+
 #include <dragonbox/dragonbox.h>
 
 #include <algorithm>
@@ -14,18 +16,11 @@
 
 namespace {
 
-constexpr std::size_t MAX_TEXT = 79;
+using number_text::decimal_digit_count;
+using number_text::INTEGER_POWERS_OF_TEN;
+using number_text::write_digits;
 
-// The powers of ten from 10^0 to 10^19: all that a std::uint64_t holds.
-constexpr auto INTEGER_POWERS_OF_TEN = [] {
-    std::array<std::uint64_t, std::numeric_limits<std::uint64_t>::digits10 + 1> powers{};
-    std::uint64_t power = 1;
-    for (auto& entry : powers) {
-        entry = power;
-        power *= 10;
-    }
-    return powers;
-}();
+constexpr std::size_t MAX_TEXT = 79;
 
 // The powers of ten from 10^0 to 10^17 as doubles: each is exact (5^17 is below 2^53), and up to
 // 10^10 in a float.
@@ -36,61 +31,6 @@ constexpr auto POWERS_OF_TEN = [] {
     }
     return powers;
 }();
-
-// The number of decimal digits of `integer`, 1 for 0. The bit length of integer | 1 (the same
-// count: 10^k is even) times log10(2), for which 1233/4096 is close enough below 2^64, is the
-// count or one less, and one comparison tells which.
-int decimal_digit_count(std::uint64_t integer) {
-    const std::uint64_t odd = integer | 1U;
-    const int bits = std::numeric_limits<std::uint64_t>::digits - __builtin_clzll(odd);
-    const int guess = (bits * 1233) >> 12U;
-    return guess + (odd >= INTEGER_POWERS_OF_TEN[static_cast<std::size_t>(guess)] ? 1 : 0);
-}
-
-// The eight digits of `digits` (below 10^8), leading zeros too, as the characters of a
-// little-endian 64-bit word: its lowest byte holds the first digit. Halves of four digits, then
-// pairs, then single digits are split side by side in the lanes of the word: below 10^4 a
-// division by 100 is (x * 10486) >> 20, below 100 one by 10 is (x * 103) >> 10, and each lane's
-// product stays inside its lane.
-std::uint64_t eight_digit_text(std::uint32_t digits) {
-    const std::uint64_t fours = digits / 10'000 | std::uint64_t{digits % 10'000} << 32U;
-    const std::uint64_t hundreds = (fours * 10'486 >> 20U) & 0x0000'007F'0000'007FU;
-    const std::uint64_t pairs = hundreds | (fours - hundreds * 100) << 16U;
-    const std::uint64_t tens = (pairs * 103 >> 10U) & 0x000F'000F'000F'000FU;
-    const std::uint64_t singles = tens | (pairs - tens * 10) << 8U;
-    return singles + 0x3030'3030'3030'3030U;
-}
-
-// Stores the last `count` (1 to 8) characters of an eight-digit text at `out`, then zero bytes
-// up to eight.
-void store_last(char* out, std::uint64_t text, int count) {
-    static_assert(__BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__, "digit texts are little-endian");
-    const std::uint64_t last = text >> (8U * static_cast<unsigned>(8 - count));
-    std::memcpy(out, &last, sizeof last);
-}
-
-// Writes the last `count` (1 to 20) decimal digits of `value`, leading zeros too, and returns
-// their end. The digits are computed eight at a time and stored eight bytes at a time, straight
-// into place: up to seven bytes past the end are written too, which what follows overwrites or
-// the terminator ends (the longest text, 24 characters, leaves room for them in 80 bytes).
-char* write_digits(char* out, std::uint64_t value, int count) {
-    constexpr std::uint64_t eight_digits = 100'000'000;
-    char* const end = out + count;
-    const std::uint64_t high = value / eight_digits;
-    if (count > 8) {
-        const std::uint64_t middle = high % eight_digits;
-        if (count > 16) {
-            store_last(out, eight_digit_text(static_cast<std::uint32_t>(high / eight_digits)),
-                       count - 16);
-            store_last(end - 16, eight_digit_text(static_cast<std::uint32_t>(middle)), 8);
-        } else {
-            store_last(out, eight_digit_text(static_cast<std::uint32_t>(middle)), count - 8);
-        }
-    }
-    const auto low = static_cast<std::uint32_t>(value - high * eight_digits);
-    store_last(count > 8 ? end - 8 : out, eight_digit_text(low), count > 8 ? 8 : count);
-    return end;
-}
 
 // Whether to_chars' plain form takes scientific notation for `count` significant digits with
 // the decimal point after `point` of them (before -point zeros when not positive): only when it
