@@ -70,6 +70,12 @@ inline void store_last(char* out, std::uint64_t text, int count) {
 inline char* write_digits(char* out, std::uint64_t value, int count) {
     constexpr std::uint64_t eight_digits = 100'000'000;
     char* const end = out + count;
+    if (count <= 4) {
+        // Four digits or fewer fit the lowest lane: two steps instead of three, and the
+        // characters moved up to where store_last takes them.
+        store_last(out, split_singles(split_pairs(value % 10'000)) << 32U, count);
+        return end;
+    }
     const std::uint64_t high = value / eight_digits;
     if (count > 8) {
         const std::uint64_t middle = high % eight_digits;
@@ -82,12 +88,6 @@ inline char* write_digits(char* out, std::uint64_t value, int count) {
         }
     }
     const auto low = static_cast<std::uint32_t>(value - high * eight_digits);
-    if (count <= 4) {
-        // Four digits or fewer fit the lowest lane: two steps instead of three, and the
-        // characters moved up to where store_last takes them.
-        store_last(out, split_singles(split_pairs(low)) << 32U, count);
-        return end;
-    }
     store_last(count > 8 ? end - 8 : out, eight_digit_text(low), count > 8 ? 8 : count);
     return end;
 }

@@ -91,12 +91,13 @@ char* write_exact_integer(char* out, Number magnitude) {
     return scientific_is_shorter(significant, static_cast<int>(end - out)) ? nullptr : end;
 }
 
-// Writes `integral`, a decimal point and `fraction` as `fraction_length` (1 to 20) digits with
-// its leading zeros, and returns the end.
-char* write_fixed(char* out, std::uint64_t integral, std::uint64_t fraction, int fraction_length) {
+// Writes `integral`, a decimal point and the last `fraction_length` (1 to 20) digits of
+// `digits`, a decimal's digits that end with its fraction, leading zeros of the fraction too;
+// returns the end.
+char* write_fixed(char* out, std::uint64_t integral, std::uint64_t digits, int fraction_length) {
     out = std::to_chars(out, out + MAX_TEXT, integral).ptr;
     *out++ = '.';
-    return write_digits(out, fraction, fraction_length);
+    return write_digits(out, digits, fraction_length);
 }
 
 // The binary exponent e of a positive normal value: 2^e <= magnitude < 2^(e + 1).
@@ -196,8 +197,7 @@ char* write_short_fraction(char* out, Number magnitude) {
     // 10^-k at this scale): the two have the same integral part, and the conversion truncates
     // to it.
     const auto integral = static_cast<std::uint64_t>(magnitude);
-    return write_fixed(out, integral, digits - integral * INTEGER_POWERS_OF_TEN[fraction_length],
-                       static_cast<int>(fraction_length));
+    return write_fixed(out, integral, digits, static_cast<int>(fraction_length));
 }
 
 // Writes an integral `magnitude` with all its digits, as to_chars' fixed notation does; from
@@ -231,17 +231,10 @@ char* write_shortest_decimal(char* out, Number magnitude) {
         // ones padded with zeros.
         return write_integer(out, magnitude);
     }
-    // The decimal's integral part is the value's own: an integer between the two would lie
-    // closer to the value and have fewer digits, and be the shortest decimal instead. Below 1
-    // the fraction is all the digits, with up to three zeros before them.
-    const auto integral = static_cast<std::uint64_t>(static_cast<std::int64_t>(magnitude));
-    const int fraction_length = -decimal.exponent;
-    const std::uint64_t fraction =
-        integral == 0
-            ? significand
-            : significand -
-                  integral * INTEGER_POWERS_OF_TEN[static_cast<std::size_t>(fraction_length)];
-    return write_fixed(out, integral, fraction, fraction_length);
+    // The decimal's integral part is the value's own (0 below 1): an integer between the two
+    // would lie closer to the value and have fewer digits, and be the shortest decimal instead.
+    return write_fixed(out, static_cast<std::uint64_t>(static_cast<std::int64_t>(magnitude)),
+                       significand, -decimal.exponent);
 }
 
 template <typename Number>
