@@ -258,7 +258,7 @@ int write_shortest(char* buffer, Number value) {
     }
     char* end = buffer;
     if (special.empty()) {
-        // Without a branch: signs often alternate, as in coordinates.
+        // Without a branch, which random signs (a mesh's coordinates) would often mislead.
         *end = '-';
         end += std::signbit(value) ? 1 : 0;
         end = write_magnitude(end, std::fabs(value));
