@@ -7,6 +7,7 @@ set -euo pipefail
 
 packages=(
     g++ binutils cmake make libboost1.81-dev # the library, jsonfmt; nm and c++filt for tests
+    libdragonbox-dev                         # the number-text companion's shortest digits
     libcli11-dev man-db                      # jsonfmt's options; its man page checked
     libgtest-dev locales                     # the unit tests; locale-gen for de_DE.UTF-8
     git clang-format clang-tidy              # formatting check over `git ls-files`, clang-tidy

@@ -40,12 +40,13 @@ cmake --build build/tsan -j "$jobs" --target threads_test
 build/tsan/tests/threads_test --gtest_brief=1
 
 # The two 100,000-level tests write ~40 GB of pretty indentation each: too slow under
-# valgrind, and covered by the runs above. The allocation tests replace operator new
+# valgrind, and covered by the runs above; so are the number-text tables, which run on a
+# sample of 100,000 values each there. The allocation tests replace operator new
 # themselves: valgrind is told to leave those replacements alone (it still sees the mallocs).
 echo "== valgrind"
 find build/release/tests -maxdepth 1 -type f -executable -name '*_test' | sort |
-    xargs -P "$jobs" -I{} sh -c 'valgrind --quiet --error-exitcode=1 --leak-check=full \
-        --soname-synonyms=somalloc=nouserintercepts \
+    JSONVALUE_NUMBER_TEXT_SAMPLES=100000 xargs -P "$jobs" -I{} sh -c 'valgrind --quiet \
+        --error-exitcode=1 --leak-check=full --soname-synonyms=somalloc=nouserintercepts \
         --errors-for-leak-kinds=definite,indirect,possible "$1" --gtest_brief=1 \
         --gtest_filter=-DeepNesting.*HundredThousandDeep >"$1.valgrind" 2>&1 ||
         { cat "$1.valgrind"; echo "valgrind: $1 failed"; exit 255; }' _ {}

@@ -1,5 +1,9 @@
 #include "number_text.hpp"
 
+#include "decimal_digits.hpp"
+
+#include <dragonbox/dragonbox.h>
+
 #include <algorithm>
 #include <array>
 #include <charconv>
@@ -12,76 +16,88 @@
 
 namespace {
 
+using number_text::decimal_digit_count;
+using number_text::INTEGER_POWERS_OF_TEN;
+using number_text::write_digits;
+
 constexpr std::size_t MAX_TEXT = 79;
 
-// Writes an integral value of magnitude below 2^digits (2^53 for double, 2^24 for float) with
-// the integer to_chars and returns the end of the text, or nullptr for any other value. Every
-// such integer is exact, and no decimal with fewer significant digits lies within half a unit of
-// it, so its shortest round-trip digits are its own without trailing zeros: the text is the one
-// the floating to_chars gives, found without its digit search. That to_chars writes fixed
-// notation unless scientific ("1e+05", at most two exponent digits here) is strictly shorter,
-// which trailing zeros alone can make it; those values, and -0, are left to it.
-template <typename Number>
-char* write_exact_integer(char* buffer, Number value) {
-    constexpr auto limit =
-        static_cast<Number>(std::uint64_t{1} << std::numeric_limits<Number>::digits);
-    if (!(value > -limit && value < limit) || (value == 0 && std::signbit(value))) {
-        return nullptr;
-    }
-    const auto integer = static_cast<std::int64_t>(value);
-    if (static_cast<Number>(integer) != value) {
-        return nullptr;
-    }
-    char* const end = std::to_chars(buffer, buffer + MAX_TEXT, integer).ptr;
-    const char* const first_digit = buffer + (integer < 0 ? 1 : 0);
-    const auto digits = end - first_digit;
-    const char* significant_end = end;
-    while (significant_end - first_digit > 1 && significant_end[-1] == '0') {
-        --significant_end;
-    }
-    const auto significant = significant_end - first_digit;
-    const auto scientific_length = significant + (significant > 1 ? 1 : 0) + 4;
-    return digits <= scientific_length ? end : nullptr;
-}
-
-// The powers of ten from 10^0 to 10^17 as integers.
-constexpr auto INTEGER_POWERS_OF_TEN = [] {
-    std::array<std::uint64_t, 18> powers{};
-    std::uint64_t power = 1;
-    for (auto& entry : powers) {
-        entry = power;
-        power *= 10;
-    }
-    return powers;
-}();
-
-// The same powers as doubles: each is exact in a double (5^17 is below 2^53), and up to 10^10
-// in a float.
+// The powers of ten from 10^0 to 10^17 as doubles: each is exact (5^17 is below 2^53), and up to
+// 10^10 in a float.
 constexpr auto POWERS_OF_TEN = [] {
-    std::array<double, INTEGER_POWERS_OF_TEN.size()> powers{};
+    std::array<double, std::numeric_limits<double>::max_digits10 + 1> powers{};
     for (std::size_t i = 0; i != powers.size(); ++i) {
         powers.at(i) = static_cast<double>(INTEGER_POWERS_OF_TEN.at(i));
     }
     return powers;
 }();
 
-// The integral part, a decimal point and `fraction` as `fraction_length` (1 to 17) digits with
-// its leading zeros, after a minus sign when `negative`; returns the end. The fraction is
-// written as 10^fraction_length plus itself, whose leading 1 is then overwritten by the point:
-// that writes its leading zeros with it, and every byte lands in place without a copy.
-char* write_fixed(char* buffer, bool negative, std::uint64_t integral, std::uint64_t fraction,
-                  std::size_t fraction_length) {
-    char* out = buffer;
-    if (negative) {
-        *out++ = '-';
+// Whether to_chars' plain form takes scientific notation for `count` significant digits with
+// the decimal point after `point` of them (before -point zeros when not positive): only when it
+// is strictly shorter than fixed notation.
+bool scientific_is_shorter(int count, int point) {
+    const int exponent = point - 1;
+    const int scientific_length =
+        count + (count > 1 ? 1 : 0) + (exponent <= -100 || exponent >= 100 ? 5 : 4);
+    const int fixed_length = point >= count ? point : point > 0 ? count + 1 : count + 2 - point;
+    return scientific_length < fixed_length;
+}
+
+// Writes `significand` (`count` digits, no trailing zero) times 10^exponent in scientific
+// notation as to_chars does: "1e+05", "1.5e-07", "1.25e+300", the exponent with at least two
+// digits.
+char* write_scientific(char* out, std::uint64_t significand, int count, int exponent) {
+    // The digits one place to the right, then the first moved in front of the point.
+    write_digits(out + 1, significand, count);
+    out[0] = out[1];
+    out[1] = '.';
+    out += count > 1 ? count + 1 : 1;
+    *out++ = 'e';
+    *out++ = exponent < 0 ? '-' : '+';
+    int magnitude = exponent < 0 ? -exponent : exponent;
+    if (magnitude >= 100) {
+        *out++ = static_cast<char>('0' + magnitude / 100);
+        magnitude %= 100;
     }
-    out = std::to_chars(out, buffer + MAX_TEXT, integral).ptr;
-    char* const point = out;
-    out =
-        std::to_chars(out, buffer + MAX_TEXT, INTEGER_POWERS_OF_TEN.at(fraction_length) + fraction)
-            .ptr;
-    *point = '.';
+    *out++ = static_cast<char>('0' + magnitude / 10);
+    *out++ = static_cast<char>('0' + magnitude % 10);
     return out;
+}
+
+// Writes a non-negative integral `magnitude` below 2^digits (2^53 for double, 2^24 for float)
+// with the integer to_chars and returns the end of the text, or nullptr for any other value.
+// Every such integer is exact, and no decimal with fewer significant digits lies within half a
+// unit of it, so its shortest round-trip digits are its own without trailing zeros: the text is
+// the one the floating to_chars gives, found without a digit search. That to_chars writes fixed
+// notation unless scientific ("1e+05", at most two exponent digits here) is strictly shorter,
+// which five trailing zeros or more can make it; those values are left to the general path.
+template <typename Number>
+char* write_exact_integer(char* out, Number magnitude) {
+    constexpr auto limit =
+        static_cast<Number>(std::uint64_t{1} << std::numeric_limits<Number>::digits);
+    const auto integer = static_cast<std::int64_t>(magnitude < limit ? magnitude : 0);
+    if (static_cast<Number>(integer) != magnitude) {
+        return nullptr;
+    }
+    char* const end = std::to_chars(out, out + MAX_TEXT, integer).ptr;
+    if (integer % 100'000 != 0 || integer == 0) {
+        return end;
+    }
+    const char* significant_end = end;
+    while (significant_end[-1] == '0') {
+        --significant_end;
+    }
+    const auto significant = static_cast<int>(significant_end - out);
+    return scientific_is_shorter(significant, static_cast<int>(end - out)) ? nullptr : end;
+}
+
+// Writes `integral`, a decimal point and the last `fraction_length` (1 to 20) digits of
+// `digits`, a decimal's digits that end with its fraction, leading zeros of the fraction too;
+// returns the end.
+char* write_fixed(char* out, std::uint64_t integral, std::uint64_t digits, int fraction_length) {
+    out = std::to_chars(out, out + MAX_TEXT, integral).ptr;
+    *out++ = '.';
+    return write_digits(out, digits, fraction_length);
 }
 
 // The binary exponent e of a positive normal value: 2^e <= magnitude < 2^(e + 1).
@@ -120,7 +136,7 @@ constexpr auto FRACTION_SCALES = [] {
     return scales;
 }();
 
-// Writes a value with a fractional part, of magnitude from 10^-3 up, whose shortest
+// Writes a non-negative value with a fractional part, from 10^-3 up, whose shortest
 // round-trip text has few enough digits (14 or 15 significant ones for a double, 5 or 6 for a
 // float), as that text in fixed notation, and returns its end; nullptr for any other value.
 // Those are the numbers people and most programs write, and this is the text the floating
@@ -138,19 +154,18 @@ constexpr auto FRACTION_SCALES = [] {
 //   notation of a fraction is never longer than scientific, which to_chars takes only when it
 //   is strictly shorter.
 template <typename Number>
-char* write_short_fraction(char* buffer, Number value) {
-    const Number magnitude = std::fabs(value);
+char* write_short_fraction(char* out, Number magnitude) {
     if (!(magnitude >= static_cast<Number>(1e-3))) {
         return nullptr;
     }
     const auto& scales = FRACTION_SCALES<Number>;
     const auto row =
         static_cast<std::size_t>(binary_exponent(magnitude) - LOWEST_FRACTION_EXPONENT);
-    if (row >= scales.size() || scales.at(row) == 0) {
+    if (row >= scales.size() || scales[row] == 0) {
         return nullptr; // no room for a fractional digit
     }
-    const std::size_t scale = scales.at(row);
-    const auto power = static_cast<Number>(POWERS_OF_TEN.at(scale));
+    const std::size_t scale = scales[row];
+    const auto power = static_cast<Number>(POWERS_OF_TEN[scale]);
     const Number scaled = magnitude * power;
     // Adding one half is exact below 2^(digits - 3); the conversion truncates.
     auto digits = static_cast<std::uint64_t>(scaled + static_cast<Number>(0.5));
@@ -182,22 +197,55 @@ char* write_short_fraction(char* buffer, Number value) {
     // 10^-k at this scale): the two have the same integral part, and the conversion truncates
     // to it.
     const auto integral = static_cast<std::uint64_t>(magnitude);
-    return write_fixed(buffer, value < 0, integral,
-                       digits - integral * INTEGER_POWERS_OF_TEN.at(fraction_length),
-                       fraction_length);
+    return write_fixed(out, integral, digits, static_cast<int>(fraction_length));
+}
+
+// Writes an integral `magnitude` with all its digits, as to_chars' fixed notation does; from
+// 2^64 up (the few up to 10^22 that it writes so) it is left to to_chars.
+template <typename Number>
+char* write_integer(char* out, Number magnitude) {
+    constexpr Number integer_limit = 0x1p64;
+    if (!(magnitude < integer_limit)) {
+        return std::to_chars(out, out + MAX_TEXT, magnitude).ptr;
+    }
+    const auto integer = static_cast<std::uint64_t>(magnitude);
+    return write_digits(out, integer, decimal_digit_count(integer));
+}
+
+// Writes any other positive finite `magnitude` in to_chars' plain form, from its shortest
+// digits found by the packaged Dragonbox: among the shortest decimals that read back to the
+// value the closest to it, ties to an even digit, a bound of the value's interval inside when its
+// significand is even, as reading rounds; the digits to_chars finds with its own search.
+template <typename Number>
+char* write_shortest_decimal(char* out, Number magnitude) {
+    const auto decimal =
+        jkj::dragonbox::to_decimal(magnitude, jkj::dragonbox::policy::sign::ignore);
+    const std::uint64_t significand = decimal.significand;
+    const int count = decimal_digit_count(significand);
+    const int point = count + decimal.exponent;
+    if (scientific_is_shorter(count, point)) {
+        return write_scientific(out, significand, count, point - 1);
+    }
+    if (decimal.exponent >= 0) {
+        // An integer from 2^digits up: fixed notation writes all its digits, not the shortest
+        // ones padded with zeros.
+        return write_integer(out, magnitude);
+    }
+    // The decimal's integral part is the value's own (0 below 1): an integer between the two
+    // would lie closer to the value and have fewer digits, and be the shortest decimal instead.
+    return write_fixed(out, static_cast<std::uint64_t>(static_cast<std::int64_t>(magnitude)),
+                       significand, -decimal.exponent);
 }
 
 template <typename Number>
-char* write_finite(char* buffer, Number value) {
-    if (char* const end = write_exact_integer(buffer, value)) {
+char* write_magnitude(char* out, Number magnitude) {
+    if (char* const end = write_exact_integer(out, magnitude)) {
         return end;
     }
-    if (char* const end = write_short_fraction(buffer, value)) {
+    if (char* const end = write_short_fraction(out, magnitude)) {
         return end;
     }
-    // The shortest round-trip form needs at most 24 characters for a double, so this cannot run
-    // out of room.
-    return std::to_chars(buffer, buffer + MAX_TEXT, value).ptr;
+    return write_shortest_decimal(out, magnitude);
 }
 
 template <typename Number>
@@ -208,8 +256,15 @@ int write_shortest(char* buffer, Number value) {
     } else if (std::isinf(value)) {
         special = value > 0 ? "1e999" : "-1e999";
     }
-    char* const end = special.empty() ? write_finite(buffer, value)
-                                      : std::copy(special.begin(), special.end(), buffer);
+    char* end = buffer;
+    if (special.empty()) {
+        // Without a branch, which random signs (a mesh's coordinates) would often mislead.
+        *end = '-';
+        end += std::signbit(value) ? 1 : 0;
+        end = write_magnitude(end, std::fabs(value));
+    } else {
+        end = std::copy(special.begin(), special.end(), buffer);
+    }
     *end = '\0';
     return static_cast<int>(end - buffer);
 }
