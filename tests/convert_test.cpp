@@ -11,6 +11,7 @@
 #include <cmath>
 #include <cstdint>
 #include <deque>
+#include <forward_list>
 #include <limits>
 #include <list>
 #include <map>
@@ -93,6 +94,8 @@ TEST(Convert, StandardTypesBothWays) {
     expect_round_trip(std::vector<int>{1, 2}, "[1,2]");
     expect_round_trip(std::deque<bool>{true}, "[true]");
     expect_round_trip(std::list<std::string>{"a", "b"}, R"(["a","b"])");
+    // A range without size() is counted before its Array is made.
+    EXPECT_EQ(json::serialize(json::value_from(std::forward_list<int>{1, 2, 3})), "[1,2,3]");
     expect_round_trip(std::array<int, 2>{4, 5}, "[4,5]");
     expect_round_trip(std::set<int>{3, 1}, "[1,3]");
     expect_round_trip(std::unordered_set<int>{9}, "[9]");
