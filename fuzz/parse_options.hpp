@@ -1,4 +1,4 @@
-// The parse options a fuzz target tries: the seven switches of json::ParseOptions taken from the
+// The parse options a fuzz target tries: the switches of json::ParseOptions taken from the
 // bits of the input's first byte, so that every combination is explored with every text.
 #ifndef JSONVALUE_FUZZ_PARSE_OPTIONS_HPP
 #define JSONVALUE_FUZZ_PARSE_OPTIONS_HPP
@@ -25,6 +25,8 @@ inline json::ParseOptions options_and_text(const std::uint8_t* data, std::size_t
     options.reject_duplicate_keys = (switches & 16U) != 0;
     options.exact_numbers = (switches & 32U) != 0;
     options.allow_bom = (switches & 64U) != 0;
+    options.allow_inexact_integers = (switches & 128U) != 0; // the two number switches together
+    options.allow_overflow = (switches & 128U) != 0;
     text = std::string_view(reinterpret_cast<const char*>(data + 1), size - 1);
     return options;
 }

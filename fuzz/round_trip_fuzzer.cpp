@@ -1,8 +1,8 @@
 // Parses arbitrary bytes with options taken from the first byte; whatever parses is written
 // compact and pretty and parsed again with the same options: the Values must be equal and the
-// text stable. A number beyond the range of double parses as an infinity (unless exact numbers
-// are asked for), which is written as the string "Inf" or "-Inf": when the text holds such a
-// string (or what looks like one), only the text must be stable.
+// text stable. A number beyond the range of double parses as an infinity (with allow_overflow
+// and without exact numbers), which is written as the string "Inf" or "-Inf": when the text holds
+// such a string (or what looks like one), only the text must be stable.
 #include "parse_options.hpp"
 
 #include <json/json.hpp>

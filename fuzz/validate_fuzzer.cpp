@@ -14,9 +14,8 @@
 namespace {
 
 bool same(const json::ParseReport& left, const json::ParseReport& right) {
-    return left.result == right.result && left.offset == right.offset &&
-           left.line == right.line && left.column == right.column &&
-           left.refusal == right.refusal && left.note == right.note;
+    return left.result == right.result && left.offset == right.offset && left.line == right.line &&
+           left.column == right.column && left.refusal == right.refusal && left.note == right.note;
 }
 
 } // namespace

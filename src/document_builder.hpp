@@ -53,10 +53,8 @@ class DocumentBuilder {
     // The literal is NUL-terminated (the grammar's copy), so it is read in place.
     bool number(std::string_view literal) {
         double value = 0.0;
-        if (!options.exact_numbers) {
-            value = read_number(literal);
-        } else if (!read_number_exactly(literal, value)) {
-            return refusal.inexact(literal);
+        if (!read_kept_number(literal, options, refusal, value)) {
+            return false;
         }
         push(Kind::NUMBER).number = value;
         return true;
@@ -68,7 +66,7 @@ class DocumentBuilder {
     }
     bool key(std::string_view name) {
         if (options.reject_duplicate_keys && !repeated.add(name)) {
-            return refusal.repeated_name();
+            return refusal.repeated_name(name);
         }
         names.emplace_back(name);
         return true;

@@ -4,6 +4,9 @@
 // The options that concern a document rather than its text (exact_numbers,
 // reject_duplicate_keys), applied alike by the document builder and the validator.
 
+#include "messages.hpp"
+#include "number.hpp"
+
 #include <json/parse_options.hpp>
 
 #include <cstddef>
@@ -20,21 +23,30 @@ namespace json::detail {
 /// handler to return.
 class DocumentRefusal {
   public:
+    /// A number that exact_numbers refuses.
     [[gnu::cold]] bool inexact(std::string_view literal) {
-        constexpr std::size_t shown = 40;
-        std::string text(literal.substr(0, shown));
-        if (literal.size() > shown) {
-            text += "...";
-        }
-        text += " cannot be held exactly by a double; without the exact_numbers option it is "
-                "rounded";
-        return refuse(Refusal::INEXACT_NUMBER, ParseResult::INVALID_EXPONENT, std::move(text));
+        return refuse(Refusal::INEXACT_NUMBER, ParseResult::INVALID_EXPONENT,
+                      shown(literal) + " cannot be held exactly by a double; without "
+                                       "ParseOptions::exact_numbers it is rounded");
+    }
+    /// A number read as `value` with a change the options do not allow.
+    [[gnu::cold]] bool changed(std::string_view literal, double value, NumberChange change) {
+        return refuse(
+            Refusal::INEXACT_NUMBER, ParseResult::INVALID_EXPONENT,
+            change == NumberChange::OVERFLOW
+                ? shown(literal) + " is beyond the range of a double: read it as text through "
+                                   "json::parse_events, or allow it as an infinity with "
+                                   "ParseOptions::allow_overflow"
+                : shown(literal) + " cannot be held exactly by a double (the nearest is " +
+                      exact_integer_text(value) +
+                      "): read it as text through json::parse_events, or allow it "
+                      "rounded with ParseOptions::allow_inexact_integers");
     }
     /// A member name given a second time, at the token being reported.
-    [[gnu::cold]] bool repeated_name() {
+    [[gnu::cold]] bool repeated_name(std::string_view name) {
         return refuse(Refusal::DUPLICATE_KEY, ParseResult::MISSING_TRAILING_BRACE,
-                      "the object already has a member of this name; without the "
-                      "reject_duplicate_keys option the last one wins");
+                      "the object already has a member named " + quoted(name) +
+                          "; without ParseOptions::reject_duplicate_keys the last one wins");
     }
 
     /// When the grammar stopped because of this refusal, puts it in `report` (the place is
@@ -49,6 +61,12 @@ class DocumentRefusal {
     }
 
   private:
+    // A literal as a message shows it: its first forty characters.
+    static std::string shown(std::string_view literal) {
+        constexpr std::size_t most = 40;
+        return literal.size() <= most ? std::string(literal)
+                                      : std::string(literal.substr(0, most)) + "...";
+    }
     bool refuse(Refusal why, ParseResult code, std::string text) {
         refused = why;
         result = code;
@@ -60,6 +78,35 @@ class DocumentRefusal {
     ParseResult result = ParseResult::SUCCESS;
     std::string note;
 };
+
+/// `literal` (NUL-terminated) read into `value` as json::parse keeps it, as `options` say:
+/// rounded, or refused when a double cannot hold it as written (see ParseOptions); false, with
+/// the refusal recorded, when it is refused.
+inline bool read_kept_number(std::string_view literal, const ParseOptions& options,
+                             DocumentRefusal& refusal, double& value) {
+    if (options.exact_numbers) {
+        return read_number_exactly(literal, value) || refusal.inexact(literal);
+    }
+    value = read_number(literal);
+    if (!may_change(literal)) {
+        return true;
+    }
+    const NumberChange change = change_of(literal, value);
+    const bool allowed =
+        change == NumberChange::NONE ||
+        (change == NumberChange::INEXACT_INTEGER && options.allow_inexact_integers) ||
+        (change == NumberChange::OVERFLOW && options.allow_overflow);
+    return allowed || refusal.changed(literal, value, change);
+}
+
+/// Whether json::parse keeps `literal` as `options` say, without reading it where it cannot
+/// change (most numbers): the validator's check.
+inline bool number_is_kept(std::string_view literal, const ParseOptions& options,
+                           DocumentRefusal& refusal) {
+    double value = 0.0;
+    return (!options.exact_numbers && !may_change(literal)) ||
+           read_kept_number(literal, options, refusal, value);
+}
 
 /// The member names of the open objects, where repeated names are refused: the second of
 /// them is found when it comes. Memory: the names of the open objects.

@@ -65,14 +65,10 @@ class Validator {
     bool null() { return true; }
     bool boolean(bool) { return true; }
     // The literal is NUL-terminated (the grammar's copy).
-    bool number(std::string_view literal) {
-        double value = 0.0;
-        return !options.exact_numbers || read_number_exactly(literal, value) ||
-               refusal.inexact(literal);
-    }
+    bool number(std::string_view literal) { return number_is_kept(literal, options, refusal); }
     bool string(std::string_view) { return true; }
     bool key(std::string_view name) {
-        return !options.reject_duplicate_keys || repeated.add(name) || refusal.repeated_name();
+        return !options.reject_duplicate_keys || repeated.add(name) || refusal.repeated_name(name);
     }
     bool begin_array() { return true; }
     bool end_array() { return true; }

@@ -18,6 +18,10 @@ std::string kind_message(const char* expected, const Value& found);
 /// "index INDEX out of range for a JSON array of SIZE elements", INDEX as written.
 std::string index_out_of_range(std::string_view index, std::size_t size);
 
+/// `text` as a JSON string, so that quotes, control characters and bytes that are not UTF-8 in
+/// it show: "\"a\\u0000b\"".
+std::string quoted(std::string_view text);
+
 } // namespace json::detail
 
 #endif

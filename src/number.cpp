@@ -1,7 +1,15 @@
 // Reading a JSON number's text into a double.
 #include "number.hpp"
 
+#include <json/value.hpp>
+
 #include <json/text_conversion.hpp>
+
+#include <cmath>
+#include <cstdint>
+#include <limits>
+#include <stdexcept>
+#include <string>
 
 namespace json::detail {
 
@@ -55,6 +63,96 @@ double read_number(std::string_view literal) noexcept {
     }
     const double magnitude = *scaled_exactly(digits, -decimals);
     return negative ? -magnitude : magnitude;
+}
+
+bool may_change(std::string_view literal) noexcept {
+    constexpr std::size_t exact_digits = 15; // every integer of up to fifteen digits is exact
+    const std::size_t point_or_exponent = literal.find_first_of(".eE");
+    if (point_or_exponent == std::string_view::npos) {
+        return literal.size() > exact_digits; // an integer of sixteen or more characters
+    }
+    const std::size_t sign = literal.front() == '-' ? 1 : 0;
+    return point_or_exponent - sign > exact_digits || // beyond the range without an exponent
+           literal.find_first_of("eE", point_or_exponent) != std::string_view::npos;
+}
+
+namespace {
+
+// The decimal digits of `high` * 2^shift, most significant first.
+std::string decimal_of(std::uint64_t high, int shift) {
+    std::string digits = std::to_string(high); // most significant first
+    // Doubled in place, digit by digit from the end: at most 971 doublings of 309 digits.
+    for (int step = 0; step < shift; ++step) {
+        int carry = 0;
+        for (auto digit = digits.rbegin(); digit != digits.rend(); ++digit) {
+            const int doubled = (*digit - '0') * 2 + carry;
+            *digit = static_cast<char>('0' + doubled % 10);
+            carry = doubled / 10;
+        }
+        if (carry != 0) {
+            digits.insert(digits.begin(), static_cast<char>('0' + carry));
+        }
+    }
+    return digits;
+}
+
+} // namespace
+
+std::string exact_integer_text(double value) {
+    const double magnitude = std::fabs(value);
+    std::string digits;
+    if (magnitude < 18446744073709551616.0) { // 2^64
+        digits = std::to_string(static_cast<std::uint64_t>(magnitude));
+    } else {
+        int exponent = 0;
+        const double significand = std::frexp(magnitude, &exponent); // in [0.5, 1)
+        constexpr int significand_bits = 53;
+        digits = decimal_of(static_cast<std::uint64_t>(std::ldexp(significand, significand_bits)),
+                            exponent - significand_bits);
+    }
+    return std::signbit(value) ? "-" + digits : digits;
+}
+
+NumberChange change_of(std::string_view literal, double value) {
+    if (!std::isfinite(value)) {
+        return NumberChange::OVERFLOW;
+    }
+    constexpr double exact_integers = 9007199254740992.0; // 2^53: every integer below is exact
+    if (std::fabs(value) < exact_integers ||
+        literal.find_first_of(".eE") != std::string_view::npos) {
+        return NumberChange::NONE; // a fraction or an exponent is rounded as asked
+    }
+    // JSON integers have no leading zeros: equal values have equal digits.
+    const std::string_view digits = literal.substr(literal.front() == '-' ? 1 : 0);
+    return digits == exact_integer_text(std::fabs(value)) ? NumberChange::NONE
+                                                          : NumberChange::INEXACT_INTEGER;
+}
+
+namespace {
+
+// Refuses an integer that no double holds, naming the double nearest to it.
+template <typename Integer>
+double checked_double(Integer number) {
+    const auto nearest = static_cast<double>(number);
+    // The range of Integer is [min, 2^digits): both ends are exact doubles.
+    constexpr double past_largest =
+        static_cast<double>(std::uint64_t{1} << (std::numeric_limits<Integer>::digits - 1)) * 2;
+    if (nearest < past_largest && static_cast<Integer>(nearest) == number) {
+        return nearest;
+    }
+    throw std::out_of_range(
+        std::to_string(number) + " cannot be held exactly by a double (the nearest is " +
+        exact_integer_text(nearest) + "): keep it as a string, or convert it to a double first");
+}
+
+} // namespace
+
+double checked_exact_double(long long number) {
+    return checked_double(number);
+}
+
+double checked_exact_double(unsigned long long number) {
+    return checked_double(number);
 }
 
 double string_to_double(const char* text) {

@@ -11,6 +11,7 @@
 #include <cstdint>
 #include <cstring>
 #include <optional>
+#include <string>
 #include <string_view>
 #include <type_traits>
 
@@ -25,6 +26,26 @@ std::optional<double> scaled_exactly(std::uint64_t digits, long long exponent) n
 /// up to fifteen digits without an exponent is converted here, others by the number-text
 /// library). Throws nothing.
 double read_number(std::string_view literal) noexcept;
+
+/// What reading a number's text into a double changes beyond rounding a fraction, the two
+/// changes json::parse refuses unless asked: an integer a double cannot hold exactly
+/// (`1234567890123456789`), and a number beyond the range of double, which becomes an
+/// infinity (`1e400`).
+enum class NumberChange : unsigned char { NONE, INEXACT_INTEGER, OVERFLOW };
+
+/// Whether reading `literal` can change it as NumberChange says: only a literal with an
+/// exponent, or with sixteen or more digits before its point, can. Linear in its length, one
+/// look for the first point or exponent. Throws nothing.
+bool may_change(std::string_view literal) noexcept;
+
+/// What reading `literal` as `value` (the double read_number gave) changed. Linear in the
+/// length of the literal; an integer from 2^53 up is compared with the double's exact decimal
+/// digits. Throws std::bad_alloc.
+NumberChange change_of(std::string_view literal, double value);
+
+/// The exact decimal digits of a double that is an integer (as every double from 2^53 up is),
+/// with its sign: "1234567890123456768". Throws std::bad_alloc.
+std::string exact_integer_text(double value);
 
 /// Reads the JSON number `literal` (NUL-terminated) into `value`, the double read_number gives,
 /// and tells whether write_number writes that double back as text that denotes the same

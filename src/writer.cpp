@@ -248,11 +248,9 @@ void Writer::State::check_document(const Value& document) const {
     }
 }
 
-Writer::Writer(std::string& text, const WriteOptions& options)
-    : state(new State(text, options)) {}
+Writer::Writer(std::string& text, const WriteOptions& options) : state(new State(text, options)) {}
 
-Writer::Writer(std::ostream& out, const WriteOptions& options)
-    : state(new State(out, options)) {}
+Writer::Writer(std::ostream& out, const WriteOptions& options) : state(new State(out, options)) {}
 
 Writer::~Writer() {
     try {

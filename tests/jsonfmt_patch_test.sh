@@ -64,11 +64,11 @@ expect patch-inexact 1 "" 'inexact.json:1:8: error: valid JSON, but building the
 {"id": 12345678901234567890...
        ^' --patch scale.json inexact.json
 put repeated.json '{"a": 1, "a": 2}'
-expect patch-repeated 1 "" 'repeated.json:1:10: error: valid JSON, but building the document would change it: the object already has a member of this name
+expect patch-repeated 1 "" 'repeated.json:1:10: error: valid JSON, but building the document would change it: the object already has a member named "a"
 {"a": 1, "a": 2}
          ^' --patch scale.json repeated.json
 put repeated-op.json '[{"op":"add","path":"/baz","value":"qux","op":"remove"}]'
-expect patch-repeated-op 2 "" 'repeated-op.json:1:42: error: valid JSON, but building the document would change it: the object already has a member of this name
+expect patch-repeated-op 2 "" 'repeated-op.json:1:42: error: valid JSON, but building the document would change it: the object already has a member named "op"
 [{"op":"add","path":"/baz","value":"qux","op":"remove"}]
                                          ^' --patch repeated-op.json deploy.json
 expect patch-missing-patch 2 "" "jsonfmt: none.json: No such file or directory" --patch none.json deploy.json

@@ -4,6 +4,9 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <cstdint>
+#include <functional>
+#include <stdexcept>
 
 namespace {
 
@@ -35,6 +38,49 @@ TEST(Value, ConstructorsSelectTheirAlternative) {
         EXPECT_EQ(value.which(), which) << serialize(value);
     }
     EXPECT_FALSE((std::is_constructible_v<Value, const Value*>));
+}
+
+// An integer becomes a double only when the double holds it exactly: no 64-bit id is rounded
+// without a word, whichever way the Value is made.
+TEST(Value, IntegersAreHeldExactlyOrRefused) {
+    const std::pair<Value, double> held[] = {
+        {std::int64_t{9007199254740992}, 9007199254740992.0},
+        {std::int64_t{-9007199254740994}, -9007199254740994.0},
+        {INT64_MIN, -0x1p63},
+        {std::uint64_t{1} << 63U, 0x1p63},
+        {std::uint64_t{0xFFFFFFFFFFFFF800}, 0x1.fffffffffffffp63},
+        {std::int64_t{1} << 62U, 0x1p62},
+    };
+    for (const auto& [value, number] : held) {
+        EXPECT_EQ(value, number) << number;
+    }
+    const auto refusal = [](const std::function<void()>& make) {
+        try {
+            make();
+        } catch (const std::out_of_range& error) {
+            return std::string(error.what());
+        }
+        return std::string("(nothing thrown)");
+    };
+    const std::pair<std::function<void()>, const char*> refused[] = {
+        {[] { Value(std::int64_t{1234567890123456789}); },
+         "1234567890123456789 cannot be held exactly by a double (the nearest is "
+         "1234567890123456768): keep it as a string, or convert it to a double first"},
+        {[] { Value(INT64_MAX); }, "9223372036854775807 cannot be held exactly by a double (the "
+                                   "nearest is 9223372036854775808): "},
+        {[] { Value(UINT64_MAX); }, "18446744073709551615 cannot be held exactly by a double (the "
+                                    "nearest is 18446744073709551616): "},
+        {[] { Value(std::int64_t{-9007199254740993}); }, "-9007199254740993 cannot be held"},
+        {[] {
+             json::value_from(std::vector<long long>{1, 9007199254740993});
+         },
+         "9007199254740993 cannot be held"},
+        {[] { Value(json::Property("id") = 1234567890123456789LL); },
+         "1234567890123456789 cannot be held"},
+    };
+    for (const auto& [make, message] : refused) {
+        EXPECT_EQ(refusal(make).rfind(message, 0), 0U) << refusal(make);
+    }
 }
 
 // Each sample onto each sample, from inside the target's own tree and onto itself too: copies

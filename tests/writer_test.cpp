@@ -109,7 +109,10 @@ TEST(Writer, EventsGiveTheTextOfSerializeOnTheBenchDocuments) {
         std::ostringstream text;
         text << file.rdbuf();
         Value document;
-        ASSERT_EQ(parse(text.str(), document), ParseResult::SUCCESS) << name;
+        // twitter.json's 64-bit ids are rounded on purpose: the text is the rounded document's.
+        ParseOptions rounding;
+        rounding.allow_inexact_integers = true;
+        ASSERT_TRUE(parse(text.str(), document, rounding)) << name;
         expect_text_of_serialize(document);
         WriteOptions pretty;
         pretty.pretty = true;

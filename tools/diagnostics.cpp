@@ -12,11 +12,12 @@ namespace {
 // by default, and the flag that turns it on takes its name.
 std::string with_flag_names(std::string note) {
     static constexpr std::pair<std::string_view, std::string_view> OPTION_TO_FLAG[] = {
-        {"the allow_comments option", "--allow-comments"},
-        {"the allow_trailing_commas option", "--allow-trailing-commas"},
-        {"the allow_invalid_utf8 option", "--lossy"},
-        {"the allow_lone_surrogates option", "--lossy"},
+        {"ParseOptions::allow_comments", "--allow-comments"},
+        {"ParseOptions::allow_trailing_commas", "--allow-trailing-commas"},
+        {"ParseOptions::allow_invalid_utf8", "--lossy"},
+        {"ParseOptions::allow_lone_surrogates", "--lossy"},
         {"ParseOptions::allow_bom", "--allow-bom"},
+        {"ParseOptions::max_depth", "--max-depth"},
     };
     for (const auto& [option, flag] : OPTION_TO_FLAG) {
         if (const std::size_t at = note.find(option); at != std::string::npos) {
@@ -32,16 +33,15 @@ void complain(const std::string& message) {
     std::fprintf(stderr, "jsonfmt: %s\n", message.c_str());
 }
 
-// A refusal of bad UTF-8 or of an unpaired surrogate is said by its note alone: the grammar's
-// code that comes with it only approximates the reason. The surrogate is valid JSON, which
-// only a change (to U+FFFD) could write.
+// The library's message, which leads with the reason of a refusal, in jsonfmt's words. An
+// unpaired surrogate is valid JSON, which only a change (to U+FFFD) could write: said so.
 std::string failure_message(const json::ParseReport& report) {
     json::ParseReport shown = report;
     shown.note = with_flag_names(report.note);
     if (report.refusal == json::Refusal::LONE_SURROGATE) {
         return "valid JSON, but jsonfmt would change it: " + shown.note;
     }
-    return report.refusal == json::Refusal::INVALID_UTF8 ? shown.note : shown.message();
+    return shown.message();
 }
 
 // The line is cut to a window around the failure on long (minified) lines, or where the text

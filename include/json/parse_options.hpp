@@ -43,10 +43,11 @@ JSONVALUE_API const char* get_parse_result_description(ParseResult result);
 
 /// What json::parse accepts beyond strict JSON, and what it refuses although the text is JSON.
 /// Every flag is off by default: strict RFC 8259, with nothing changed silently that the
-/// parser can tell (bad UTF-8 and unpaired surrogates are refused), except that a repeated
-/// member name keeps the last member (as every common parser does) and numbers are rounded
-/// to double as JSON parsers do. An aggregate: C++20 callers can write
-/// `{.allow_comments = true}`.
+/// parser can tell: bad UTF-8, unpaired surrogates, integers a double cannot hold exactly and
+/// numbers beyond the range of double are refused. Two changes stay, as with every common
+/// parser: a repeated member name keeps the last member, and a number with a fraction or an
+/// exponent is rounded to the nearest double (1e-400 to 0). An aggregate: C++20 callers can
+/// write `{.allow_comments = true}`.
 struct ParseOptions {
     /// Arrays and objects nested deeper than this are refused.
     std::size_t max_depth = 512;
@@ -67,10 +68,21 @@ struct ParseOptions {
     /// Skip a UTF-8 byte order mark (EF BB BF) before the text. Off: refused, with
     /// Refusal::BYTE_ORDER_MARK (RFC 8259 forbids writing one and lets a parser ignore it).
     bool allow_bom = false;
+    /// Round an integer literal (no fraction, no exponent) that a double cannot hold exactly
+    /// to the nearest double: `1234567890123456789` becomes 1234567890123456768. Off: refused
+    /// with Refusal::INEXACT_NUMBER (`9007199254740993` is refused, `9007199254740994` and
+    /// `100000000000000000000` are held exactly). json::parse_events hands every literal over
+    /// as written, which is how a caller reads such an id exactly.
+    bool allow_inexact_integers = false;
+    /// Read a number beyond the range of double (`1e400`, `-1e400`) as plus or minus
+    /// infinity, which the writer writes as the string "Inf" or "-Inf". Off: refused with
+    /// Refusal::INEXACT_NUMBER.
+    bool allow_overflow = false;
     /// Refuse a number unless the double it becomes is written back by this library as the
     /// same decimal number (`1.50`, `1E2`, `-0`, `0.1` pass; `1e400`, `1e-400`,
-    /// `9007199254740993`, `0.10000000000000001` are refused). Costs nothing extra for numbers
-    /// of at most 15 significant digits between 2.2250738585072014e-308 and 2^53.
+    /// `9007199254740993`, `0.10000000000000001` are refused), whatever the two options above
+    /// say. Costs nothing extra for numbers of at most 15 significant digits between
+    /// 2.2250738585072014e-308 and 2^53.
     bool exact_numbers = false;
 };
 
@@ -81,9 +93,11 @@ enum class Refusal {
     INVALID_UTF8,    ///< a string or member name that is not well-formed UTF-8
     LONE_SURROGATE,  ///< a \u escape of a surrogate without its other half
     DUPLICATE_KEY,   ///< a member name given twice, with reject_duplicate_keys
-    INEXACT_NUMBER,  ///< a number a double cannot hold exactly, with exact_numbers
+    INEXACT_NUMBER,  ///< a number a double cannot hold as written (see ParseOptions)
     STOPPED,         ///< a handler of json::parse_events returned false
     BYTE_ORDER_MARK, ///< a UTF-8 byte order mark before the text, without allow_bom
+    COMMENT,         ///< a comment, without allow_comments
+    TRAILING_COMMA,  ///< a comma before `]` or `}`, without allow_trailing_commas
 };
 
 /// The detailed outcome of json::parse: the code, and for a failure where it happened and,
@@ -93,25 +107,34 @@ enum class Refusal {
 /// TOO_DEEP with MISSING_TRAILING_BRACKET or MISSING_TRAILING_BRACE (the container that could
 /// not be opened), INVALID_UTF8 with MISSING_TRAILING_QUOTE (as a raw control character in a
 /// string is: a byte that cannot stand there), LONE_SURROGATE with INVALID_UNICODE_ESCAPE,
-/// DUPLICATE_KEY with MISSING_TRAILING_BRACE (the object cannot be completed as written) and
+/// DUPLICATE_KEY with MISSING_TRAILING_BRACE (the object cannot be completed as written),
 /// INEXACT_NUMBER with INVALID_EXPONENT (the number's magnitude or precision is beyond a
-/// double's), BYTE_ORDER_MARK with MISSING_LEADING_DIGIT (no value starts with it). The
+/// double's), STOPPED with UNEXPECTED_END_OF_INPUT, BYTE_ORDER_MARK with MISSING_LEADING_DIGIT
+/// (no value starts with it), COMMENT with the code of what the grammar expected where the
+/// comment starts, TRAILING_COMMA with MISSING_LEADING_DIGIT in an array and
+/// MISSING_LEADING_QUOTE in an object (what stands there instead of a value or a name). The
 /// position is that of the first byte of the ill-formed UTF-8 sequence, the backslash of the
 /// unpaired escape, the opening quote of the second member name, the first character of the
-/// number, or the start of the text.
+/// number, the comment or the closing bracket, or the start of the text.
 struct ParseReport {
     ParseResult result = ParseResult::SUCCESS; ///< the outcome
     std::size_t offset = 0;                    ///< byte offset of the failure in the text
     std::size_t line = 0;                      ///< 1-based line of the failure (0 on success)
     std::size_t column = 0;                    ///< 1-based column, counted in bytes (0 on success)
-    std::string note; ///< e.g. "the document is nested deeper than the maximum depth"
+    std::string note; ///< why, e.g. "the document is nested deeper than 512 levels; ..."
     Refusal refusal = Refusal::NONE; ///< set when valid text was refused, see above
 
     /// Whether the text parsed.
     explicit operator bool() const { return result == ParseResult::SUCCESS; }
 
-    /// The code's description, followed by the note when there is one.
+    /// What a person reads first: for a refusal, the note alone, which says why and names the
+    /// option that would accept the text ("the object already has a member named \"a\"; ...");
+    /// for a failure on the grammar, the code's description, followed by the note in
+    /// parentheses when there is one ("No error" on success). Throws std::bad_alloc.
     std::string message() const {
+        if (refusal != Refusal::NONE) {
+            return note;
+        }
         std::string text = get_parse_result_description(result);
         if (!note.empty()) {
             text.append(" (").append(note).append(")");

@@ -8,6 +8,8 @@
 #include <boost/variant.hpp>
 
 #include <cstddef>
+#include <cstdint>
+#include <limits>
 #include <map>
 #include <string>
 #include <string_view>
@@ -50,6 +52,32 @@ enum Alternative : int {
     OBJECT_INDEX = 6,
     FLOAT_INDEX = 7,
 };
+
+/// The double that holds `number` exactly; throws std::out_of_range when there is none.
+JSONVALUE_API double checked_exact_double(long long number);
+/// @copydoc checked_exact_double(long long)
+JSONVALUE_API double checked_exact_double(unsigned long long number);
+
+/// The double that holds `number` exactly, converted inline where every value of its type
+/// fits in a double's 53 bits or the value is small enough. Throws std::out_of_range when no
+/// double holds it.
+template <typename Integer>
+double exact_double(Integer number) {
+    constexpr int double_digits = 53;
+    if constexpr (std::numeric_limits<Integer>::digits <= double_digits) {
+        return static_cast<double>(number);
+    } else {
+        constexpr auto exact_limit = static_cast<Integer>(std::uint64_t{1} << double_digits);
+        if (number <= exact_limit && (std::is_unsigned_v<Integer> || number >= -exact_limit)) {
+            return static_cast<double>(number);
+        }
+        if constexpr (std::is_signed_v<Integer>) {
+            return checked_exact_double(static_cast<long long>(number));
+        } else {
+            return checked_exact_double(static_cast<unsigned long long>(number));
+        }
+    }
+}
 
 /// Selects the constructor that copies a Value but leaves an Array or Object empty; the deep
 /// copy starts from it and fills the containers itself.
@@ -142,12 +170,15 @@ class JSONVALUE_API Value : public detail::ValueVariant {
     /// JSON null (alternative 1).
     Value(std::nullptr_t) : detail::ValueVariant(Null()) {}
 
-    /// Any integer but bool makes a double (alternative 3). Integers beyond 2^53 in magnitude
-    /// are rounded to the nearest double and so may lose precision.
+    /// Any integer but bool makes a double (alternative 3), when the double holds it exactly:
+    /// every integer up to 2^53 in magnitude, and the larger ones that are a multiple of a
+    /// high enough power of two. Any other throws std::out_of_range ("1234567890123456789
+    /// cannot be held exactly by a double (the nearest is 1234567890123456768): ..."), so that
+    /// no 64-bit id is rounded without a word. Constant time.
     template <
         typename Integer,
         std::enable_if_t<std::is_integral_v<Integer> && !std::is_same_v<Integer, bool>, int> = 0>
-    Value(Integer number) : detail::ValueVariant(static_cast<double>(number)) {}
+    Value(Integer number) : detail::ValueVariant(detail::exact_double(number)) {}
 
     /// Pointers other than character pointers would silently become a bool: refused.
     template <typename T, std::enable_if_t<!std::is_same_v<std::remove_cv_t<T>, char>, int> = 0>

@@ -47,7 +47,8 @@ ParseResult Grammar<Handler>::fail(ParseResult result, std::string_view note) {
     if (at('/')) {
         const bool comment_like = end - cursor >= 2 && (cursor[1] == '/' || cursor[1] == '*');
         if (!options.allow_comments && comment_like) {
-            note = "comments are not JSON; the allow_comments option accepts them";
+            refused = Refusal::COMMENT;
+            note = "comments are not JSON; ParseOptions::allow_comments accepts them";
         } else if (options.allow_comments) {
             note = comment_like ? "the comment is not closed" : "a comment starts with // or /*";
         }

@@ -289,10 +289,11 @@ template <typename Handler>
 ParseResult Grammar<Handler>::trailing_comma(bool in_object) {
     if (!options.allow_trailing_commas) {
         // The code is the one the grammar gives for what stands there instead of a value.
-        return fail(in_object ? ParseResult::MISSING_LEADING_QUOTE
-                              : ParseResult::MISSING_LEADING_DIGIT,
-                    "a trailing comma is not JSON; the allow_trailing_commas option accepts "
-                    "one");
+        return refuse(Refusal::TRAILING_COMMA,
+                      in_object ? ParseResult::MISSING_LEADING_QUOTE
+                                : ParseResult::MISSING_LEADING_DIGIT,
+                      "a trailing comma is not JSON; ParseOptions::allow_trailing_commas accepts "
+                      "one");
     }
     ++cursor;
     return close();
@@ -325,7 +326,8 @@ inline ParseResult Grammar<Handler>::open(bool is_object) {
         return refuse(Refusal::TOO_DEEP,
                       is_object ? ParseResult::MISSING_TRAILING_BRACE
                                 : ParseResult::MISSING_TRAILING_BRACKET,
-                      "the document is nested deeper than the maximum depth");
+                      "the document is nested deeper than " + std::to_string(options.max_depth) +
+                          " levels; ParseOptions::max_depth sets the limit");
     }
     ++cursor;
     open_containers.push_back(is_object ? 1 : 0);

@@ -54,8 +54,8 @@ ParseResult Grammar<Handler>::escaped_string(bool is_name) {
                 return need_more();
             }
             return refuse(Refusal::INVALID_UTF8, ParseResult::MISSING_TRAILING_QUOTE,
-                          "the bytes from here on are not well-formed UTF-8; the "
-                          "allow_invalid_utf8 option keeps them as they are");
+                          "a string holds bytes that are not well-formed UTF-8; "
+                          "ParseOptions::allow_invalid_utf8 keeps them as they are");
         }
         if (*cursor != '\\') {
             return fail(ParseResult::MISSING_TRAILING_QUOTE,
@@ -137,8 +137,8 @@ ParseResult Grammar<Handler>::unicode_escapes(std::string& text) {
                 cursor = first_escape + at * escape_length;
                 return refuse(Refusal::LONE_SURROGATE, ParseResult::INVALID_UNICODE_ESCAPE,
                               std::string(cursor, escape_length) +
-                                  " is half of a surrogate pair without its other half; the "
-                                  "allow_lone_surrogates option makes it U+FFFD");
+                                  " is half of a surrogate pair without its other half; "
+                                  "ParseOptions::allow_lone_surrogates makes it U+FFFD");
             }
         }
     }

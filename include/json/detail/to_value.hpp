@@ -74,7 +74,9 @@ auto to_alternative(const T& value) {
     if constexpr (category == Category::BOOLEAN || category == Category::STRING ||
                   category == Category::NULLPTR || std::is_same_v<T, float>) {
         return value;
-    } else if constexpr (category == Category::INTEGER || category == Category::FLOATING) {
+    } else if constexpr (category == Category::INTEGER) {
+        return exact_double(value); // refuses an integer no double holds
+    } else if constexpr (category == Category::FLOATING) {
         return static_cast<double>(value);
     } else if constexpr (category == Category::TEXT) {
         return std::string(std::string_view(value));
