@@ -13,7 +13,7 @@ namespace jsonfmt {
 
 /// How much of the failing line is shown before and after the failing byte.
 constexpr std::size_t SHOWN_BEFORE = 60;
-constexpr std::size_t SHOWN_AFTER = 20;
+constexpr std::size_t SHOWN_AFTER = 60;
 
 /// Writes "jsonfmt: MESSAGE" on standard error.
 void complain(const std::string& message);
