@@ -47,6 +47,7 @@ struct DocumentRun {
     bool in_place;
     bool check_only;
     bool lossy;
+    bool color; ///< the text coloured for a terminal
 };
 
 /// Runs --patch, --diff or --merge-diff; returns the exit status. --patch: 0 when every

@@ -4,6 +4,7 @@
 // The one way a document goes from the parser to the writer, and so the one place that decides
 // its verdict: --check runs it too, with the text thrown away.
 
+#include "color_buffer.hpp"
 #include "file_output.hpp"
 #include "key_sorter.hpp"
 #include "pointer_filter.hpp"
@@ -36,19 +37,22 @@ class Discard : public std::streambuf {
     std::streamsize xsputn(const char*, std::streamsize count) override { return count; }
 };
 
-/// Writes documents, or the values at the pointer, onto one output as they are parsed.
+/// Writes documents, or the values at the pointer, onto one output as they are parsed, coloured
+/// with --color.
 class Output {
   public:
     /// `keeps_cut_text`: whether text written goes out for good (standard output, a device),
     /// not into a file that a failure discards.
     Output(const Settings& settings, int descriptor, std::string destination, bool keeps_cut_text)
         : settings(settings), destination(std::move(destination)), keeps_cut_text(keeps_cut_text),
-          buffer(descriptor), stream(&buffer), discarding(&discarded) {}
+          buffer(descriptor), colors(buffer),
+          stream(settings.color ? static_cast<std::streambuf*>(&colors) : &buffer),
+          discarding(&discarded) {}
 
     /// Parses one document with `parse`, called with the handler of its events, and writes it
     /// and a newline (with --check, into nothing). A document that fails is taken back, unless
     /// more of its text than the buffer holds went out: then what went out stays, ended by a
-    /// newline, and the result says so.
+    /// newline (and the colour it was in), and the result says so.
     template <typename Parse>
     DocumentResult document(Parse&& parse) {
         std::ostream& out = settings.check_only ? discarding : stream;
@@ -59,7 +63,7 @@ class Output {
         } catch (const std::invalid_argument& error) { // --ascii and a string that is not UTF-8
             result.unwritable = error.what();
         } catch (...) {
-            buffer.abandon_document();
+            take_back();
             stream.clear();
             throw;
         }
@@ -67,7 +71,7 @@ class Output {
         out.clear(out.rdstate() & ~std::ios::failbit);
         if (result.written()) {
             out.put('\n');
-        } else if (!buffer.abandon_document()) {
+        } else if (!take_back()) {
             stream.put('\n');
             result.cut = keeps_cut_text;
         }
@@ -84,6 +88,17 @@ class Output {
     bool finish();
 
   private:
+    // Takes the document's text back, its colours with it: true. False when part of it went
+    // out already: then a colour that is on ends where its text stops.
+    bool take_back() {
+        if (buffer.abandon_document()) {
+            colors.forget();
+            return true;
+        }
+        colors.cut();
+        return false;
+    }
+
     // The document's events go to a Writer, through the pointer's filter and the key sorter
     // when asked for. --check does not sort: the order of members changes no verdict, and it
     // holds nothing but the text.
@@ -116,6 +131,7 @@ class Output {
     std::string destination;
     bool keeps_cut_text;
     DescriptorBuffer buffer;
+    ColorBuffer colors; // used with --color only
     std::ostream stream;
     Discard discarded;
     std::ostream discarding;
