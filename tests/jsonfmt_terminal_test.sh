@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
 # Checks what jsonfmt does for a person at a terminal: its colours (on a real terminal, which
-# script(1) makes), the hint at --lines, and the context line shown around a failure.
+# script(1) makes), --raw, the hint at --lines, and the context line shown around a failure.
 # Usage: jsonfmt_terminal_test.sh JSONFMT CONFORMANCE_DIR
 # CONFORMANCE_DIR holds the parsing test suite.
 set -uo pipefail
@@ -146,7 +146,9 @@ for flags in "--tab" "--indent 0" "--library-layout" "--ascii" "--sort-keys" "-p
 done
 
 for usage in "--color=always -i $work/doc.json|--color=always writes a terminal's colour codes: it cannot rewrite a JSON file (--in-place)" \
-    "--color=sometimes|--color: sometimes not in {auto,always,never}"; do
+    "--color=sometimes|--color: sometimes not in {auto,always,never}" \
+    "-r -i $work/doc.json|--raw writes a string as text that is not JSON: it cannot rewrite a JSON file (--in-place)" \
+    "-r --ascii|--ascii excludes --raw"; do
     read -ra arguments <<<"${usage%%|*}"
     "$jsonfmt" "${arguments[@]}" </dev/null >"$work/out" 2>"$work/err"
     status=$?
@@ -154,8 +156,40 @@ for usage in "--color=always -i $work/doc.json|--color=always writes a terminal'
         "$status" "$work/out" "$work/err" "jsonfmt: ${usage#*|} (try --help)"
 done
 
+# --raw: a string is written as its text (any bytes it holds included), every other value as
+# JSON (raw NAME STATUS INPUT OUTPUT ARGS...: INPUT and OUTPUT are printf formats)
+raw() {
+    printf "$3" >"$work/raw.json"
+    printf "$4" >"$work/raw.expected"
+    "$jsonfmt" -r "${@:5}" "$work/raw.json" >"$work/out" 2>"$work/err"
+    local status=$?
+    if [ "$status" = "$2" ] && cmp -s "$work/raw.expected" "$work/out"; then
+        pass "raw-$1"
+    else
+        fail "raw-$1: status $status"; od -c "$work/out" | head -5; cat "$work/err"
+    fi
+}
+printf '"z"' >"$work/string-patch.json"
+printf '[{"op": "add", "path": "/n", "value": "new\\n"}]' >"$work/add-string.json"
+raw escapes 0 '"a\\tb\\u00e9\\\\\\n"' 'a\tb\xc3\xa9\\\n\n'
+raw nul 0 '"a\\u0000b"' 'a\0b\n'
+raw empty 0 '""' '\n'
+raw pointer 0 '{"x": "s/\\"q\\""}' 's/"q"\n' -p /x
+raw object 0 '{"x": "s"}' '{"x":"s"}\n' -c
+raw pointer-object 0 '{"x": ["s"]}' '[\n  "s"\n]\n' -p /x
+raw number 0 '1.50' '1.50\n'
+raw lines 0 '"a"\n\n{"b": "c"}\n"d\\ne"\n' 'a\n{"b":"c"}\nd\ne\n' -l
+raw not-utf8 0 '"\xff"' '\xff\n' --lossy
+raw lone-surrogate 0 '"\\ud800"' '\xef\xbf\xbd\n' --lossy
+raw sort-keys 0 '"s"' 's\n' --sort-keys
+raw fails-after 1 '"a" x' ''
+raw check 0 '"a"' '' --check
+raw merge-patch 0 '{"a": 1}' 'z\n' --merge-patch "$work/string-patch.json"
+raw patch 0 '{"a": 1}' 'new\n\n' --patch "$work/add-string.json" -p /n
+raw colors 0 '"a"\n[1]\n' "a\n$(punct '['; number 1; punct ']')\n" -l --color=always
+
 # --check gives the verdict and message of the same run
-for flags in "--color=always" "--color=always -l"; do
+for flags in "--raw" "--raw -l" "--raw -p /0" "--raw --lossy" "--color=always" "--color=always -l"; do
     "$jsonfmt" $flags "$conformance"/* >/dev/null 2>"$work/run.err"
     run_status=$?
     "$jsonfmt" --check $flags "$conformance"/* >"$work/check.out" 2>"$work/check.err"

@@ -104,6 +104,8 @@ class Destination {
     Destination& operator=(const Destination&) = delete;
 
     std::ostream& stream() { return out; }
+    // Where text that is not JSON goes, around the colours.
+    std::streambuf& text() { return buffer; }
 
     // Hands on what is written so far, so that a message that follows comes after it where
     // both go to one terminal; a failure is kept for finish().
@@ -154,10 +156,16 @@ class Destination {
     std::ostream out;
 };
 
-// Writes `value` and a newline; false (after saying why) when --ascii cannot write one of its
-// strings.
+// Writes `value` and a newline, a string as its text with --raw; false (after saying why) when
+// --ascii cannot write one of its strings.
 bool write_value(Destination& destination, const json::Value& value, const DocumentRun& run,
                  const std::string& where) {
+    if (run.raw && value.is_string()) {
+        const std::string& text = value.as_string();
+        destination.text().sputn(text.data(), static_cast<std::streamsize>(text.size()));
+        destination.stream().put('\n');
+        return true;
+    }
     std::string text;
     try {
         text = json::serialize(value, run.write_options);

@@ -90,13 +90,19 @@ void add_layout_options(CLI::App& app, Settings& settings) {
     compact->excludes(indent)->excludes(tab)->excludes(library);
 }
 
-// Adds the options for a person at a terminal.
-void add_terminal_options(CLI::App& app, std::string& color) {
+// Adds the options for a person at a terminal: colours, and a string's own text. --raw
+// refuses --ascii: a string written raw has no escapes, and an ASCII-only text that is not
+// would be a promise broken.
+void add_terminal_options(CLI::App& app, Settings& settings, std::string& color) {
     app.add_option("--color", color,
                    "colour the text for a terminal: auto (the default: when standard output is "
                    "a terminal and NO_COLOR is not set), always or never")
         ->type_name("WHEN")
         ->check(CLI::IsMember({"auto", "always", "never"}));
+    app.add_flag("-r,--raw", settings.raw,
+                 "write a string (the document, or the value at --pointer) as its text, without "
+                 "quotes or escapes; other values as JSON")
+        ->excludes("--ascii");
 }
 
 // Whether the text is coloured: with --color=always; with auto, when it goes to standard
@@ -166,6 +172,10 @@ std::string usage_problem(const Settings& settings, const std::string& color) {
     if (settings.in_place && (settings.check_only || settings.pointer)) {
         return "--in-place rewrites whole files: it goes with neither --check nor --pointer";
     }
+    if (settings.in_place && settings.raw) {
+        return "--raw writes a string as text that is not JSON: it cannot rewrite a JSON file "
+               "(--in-place)";
+    }
     if (settings.in_place && color == "always") {
         return "--color=always writes a terminal's colour codes: it cannot rewrite a JSON file "
                "(--in-place)";
@@ -188,7 +198,7 @@ std::optional<ExitStatus> read_arguments(int argc, char** argv, Settings& settin
     add_layout_options(app, settings);
     add_reading_options(app, settings);
     std::string color = "auto";
-    add_terminal_options(app, color);
+    add_terminal_options(app, settings, color);
     app.add_flag("--sort-keys", settings.sort_keys,
                  "write each object's members in byte order of their names (holds each "
                  "top-level object in memory)");

@@ -8,6 +8,7 @@
 #include "file_output.hpp"
 #include "key_sorter.hpp"
 #include "pointer_filter.hpp"
+#include "raw_string.hpp"
 #include "settings.hpp"
 
 #include <json/events.hpp>
@@ -112,14 +113,18 @@ class Output {
         return parse_into(writer, parse);
     }
 
+    // A string written raw goes around the colours (it is not JSON) to where the text goes.
     template <typename Sink, typename Parse>
     DocumentResult parse_into(Sink& sink, Parse& parse) {
+        std::streambuf* const text =
+            settings.check_only ? static_cast<std::streambuf*>(&discarded) : &buffer;
+        RawString<Sink> value(sink, settings.raw ? text : nullptr);
         DocumentResult result;
         if (!settings.pointer) {
-            result.report = parse(sink);
+            result.report = parse(value);
             return result;
         }
-        PointerFilter<Sink> filter(*settings.pointer, sink);
+        PointerFilter<RawString<Sink>> filter(*settings.pointer, value);
         result.report = parse(filter);
         if (result.report) {
             result.pointer_problem = filter.problem();

@@ -215,7 +215,8 @@ ExitStatus run(const Settings& settings) {
         return static_cast<ExitStatus>(run_document_mode(
             {settings.patches, settings.files, settings.parse_options, settings.write_options,
              settings.pointer ? &*settings.pointer : nullptr, settings.output_path,
-             settings.in_place, settings.check_only, settings.lossy, settings.color}));
+             settings.in_place, settings.check_only, settings.lossy, settings.raw,
+             settings.color}));
     }
     if (settings.in_place) {
         ExitStatus status = VALID;
