@@ -234,5 +234,10 @@ context both-sides "$ones" "x$twos]" "...${ones:140}" "x${twos:0:59}..."
 context to-line-end "" "$x59" "[" "$x59"
 context past-line-end "" "${x59}z" "[" "$x59..."
 
+# --help names the options
+for option in '--color WHEN:{auto,always,never}' -r,--raw; do
+    check "help: $option" grep -qF -- "$option" <("$jsonfmt" --help)
+done
+
 echo "$passed passed, $failures failed"
 [ "$failures" -eq 0 ]

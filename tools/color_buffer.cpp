@@ -123,8 +123,10 @@ bool ColorBuffer::start(char first) {
         return pass(PUNCTUATION_COLOR);
     }
     token = Token::SCALAR;
-    return pass(first == 'n' ? NULL_COLOR : first == 't' || first == 'f' ? BOOLEAN_COLOR
-                                                                         : NUMBER_COLOR);
+    if (first == 'n') {
+        return pass(NULL_COLOR);
+    }
+    return pass(first == 't' || first == 'f' ? BOOLEAN_COLOR : NUMBER_COLOR);
 }
 
 // A string that opens is a member name right after `{`, and after `,` in an object.

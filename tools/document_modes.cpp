@@ -204,7 +204,7 @@ ExitStatus patch_document(const DocumentRun& run, const json::Value& patch, cons
         }
     }
     return destination == nullptr || write_value(*destination, *value, run, where) ? VALID
-                                                                                  : INVALID;
+                                                                                   : INVALID;
 }
 
 // Each file rewritten on its own, when its patch applies; or all onto one destination,
@@ -229,8 +229,7 @@ int run_patch(const DocumentRun& run) {
             int written = VALID;
             for (const std::string& name : names) {
                 destination.flush();
-                written =
-                    std::max<int>(written, patch_document(run, patch, name, &destination));
+                written = std::max<int>(written, patch_document(run, patch, name, &destination));
             }
             status = std::max(status, destination.finish(written == VALID) ? written : TROUBLE);
         } catch (const std::runtime_error& error) { // a refusal, or a failing system call

@@ -91,8 +91,7 @@ void add_layout_options(CLI::App& app, Settings& settings) {
 }
 
 // Adds the options for a person at a terminal: colours, and a string's own text. --raw
-// refuses --ascii: a string written raw has no escapes, and an ASCII-only text that is not
-// would be a promise broken.
+// refuses --ascii: a string written raw keeps every character that --ascii promises to escape.
 void add_terminal_options(CLI::App& app, Settings& settings, std::string& color) {
     app.add_option("--color", color,
                    "colour the text for a terminal: auto (the default: when standard output is "

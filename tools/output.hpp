@@ -100,9 +100,9 @@ class Output {
         return false;
     }
 
-    // The document's events go to a Writer, through the pointer's filter and the key sorter
-    // when asked for. --check does not sort: the order of members changes no verdict, and it
-    // holds nothing but the text.
+    // The document's events go to a Writer, through the pointer's filter, the raw string's
+    // check and the key sorter when asked for. --check does not sort: the order of members
+    // changes no verdict, and it holds nothing but the text.
     template <typename Parse>
     DocumentResult verdict(Parse& parse, std::ostream& out) {
         json::Writer writer(out, settings.write_options);
