@@ -124,7 +124,7 @@ printf '{"k": "v"}\n["%s", x]\n{"k": 2}\n' "$long" >"$work/taken-back.jsonl"
 "$jsonfmt" --color=always -l "$work/taken-back.jsonl" >"$work/out" 2>/dev/null
 same color-taken-back "$work/taken-back.expected" "$work/out"
 # One longer than the output buffer went out in part: the colour ends where its text stops
-printf '["%s%s", x]' "$(head -c 1100000 /dev/zero | tr '\0' a)" >"$work/cut.json"
+printf '["%s", x]' "$(head -c 1100000 /dev/zero | tr '\0' a)" >"$work/cut.json"
 "$jsonfmt" --color=always "$work/cut.json" >"$work/out" 2>/dev/null
 check color-cut-ends-colour [ "$(tail -c 5 "$work/out" | od -An -c | tr -s ' ')" = " 033 [ 0 m \n" ]
 
@@ -145,6 +145,7 @@ for flags in "--tab" "--indent 0" "--library-layout" "--ascii" "--sort-keys" "-p
         "$work/plain" "$work/colored" "$work/uncolored"
 done
 
+# What would write a file that is not JSON, or an escape into a raw string, is refused
 for usage in "--color=always -i $work/doc.json|--color=always writes a terminal's colour codes: it cannot rewrite a JSON file (--in-place)" \
     "--color=sometimes|--color: sometimes not in {auto,always,never}" \
     "-r -i $work/doc.json|--raw writes a string as text that is not JSON: it cannot rewrite a JSON file (--in-place)" \
