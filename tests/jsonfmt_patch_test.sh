@@ -61,7 +61,7 @@ expect patch-not-a-patch 1 "" "deploy.json: operation 0: expected a JSON array o
 # where they stand, in the documents (status 1) and in the patch (status 2)
 put inexact.json '{"id": 12345678901234567890}'
 expect patch-inexact 1 "" 'inexact.json:1:8: error: valid JSON, but building the document would change it: 12345678901234567890 cannot be held exactly by a double
-{"id": 12345678901234567890...
+{"id": 12345678901234567890}
        ^' --patch scale.json inexact.json
 put repeated.json '{"a": 1, "a": 2}'
 expect patch-repeated 1 "" 'repeated.json:1:10: error: valid JSON, but building the document would change it: the object already has a member named "a"
@@ -144,7 +144,7 @@ expect diff-check 1 "" "" --check --diff deploy.json deploy2.json
 expect diff-output 1 "" "" -c --diff deploy2.json deploy.json -o kept.json
 check diff-output-content [ "$(cat "$work/kept.json")" = '[{"op":"remove","path":"/ports/2"},{"op":"replace","path":"/replicas","value":2},{"op":"remove","path":"/tls"}]' ]
 expect diff-inexact 2 "" 'inexact.json:1:8: error: valid JSON, but building the document would change it: 12345678901234567890 cannot be held exactly by a double
-{"id": 12345678901234567890...
+{"id": 12345678901234567890}
        ^' --diff deploy.json inexact.json
 expect diff-missing 2 "" "jsonfmt: none.json: No such file or directory" --diff deploy.json none.json
 expect diff-file 2 "" "jsonfmt: --diff compares its own two files: it takes no FILE (try --help)" --diff deploy.json deploy2.json -- other.json

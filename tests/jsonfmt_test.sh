@@ -210,17 +210,17 @@ check lines-in-order [ "$(cat "$work/both")" = $'[1]\n'"$lines_error"$'\n{"b":2}
 expect lines-pointer 1 $'1\n[2]' "$work/pointer.jsonl:2: no value at /b: no member \"b\"" -- -l -p /b "$work/pointer.jsonl"
 
 # A failure far into a stream is shown from the pieces read last, from a file and from a
-# pipe alike: on a long line a window around it, "..." where the line goes on; on a later
-# line that line, counted across the pieces
+# pipe alike: on a long line a window around it, "..." where the line goes on before it; on a
+# later line that line, counted across the pieces
 { printf '['; yes '1,' | head -n 150000 | tr -d '\n'; printf 'x, 2, 3, 4, 5, 6, 7, 8, 9]'; } >"$work/long-line.json"
 { printf '[\n'; yes '1,' | head -n 100000; printf '  x]\n'; } >"$work/many-lines.json"
 from_pipe=(bash -c 'cat "$1" | "$0" -c -' )
 window="$(printf '1,%.0s' $(seq 30))"
 expect stream-long-line 1 "" "$work/long-line.json:1:300002: $no_digit
-...${window}x, 2, 3, 4, 5, 6, 7,...
+...${window}x, 2, 3, 4, 5, 6, 7, 8, 9]
 $(printf '%63s')^" -- "$work/long-line.json"
 expect stream-long-line-pipe 1 "" "<stdin>:1:300002: $no_digit
-...${window}x, 2, 3, 4, 5, 6, 7,...
+...${window}x, 2, 3, 4, 5, 6, 7, 8, 9]
 $(printf '%63s')^" "${from_pipe[@]}" -- "$work/long-line.json"
 expect stream-later-line-pipe 1 "" "<stdin>:100002:3: $no_digit
   x]

@@ -44,6 +44,23 @@ std::string failure_message(const json::ParseReport& report) {
     return shown.message();
 }
 
+// The parser's note when a complete value is followed by more than whitespace.
+std::string lines_hint(std::string_view text, std::size_t start, const json::ParseReport& report) {
+    constexpr std::string_view goes_on = "the text goes on after the JSON value";
+    constexpr std::string_view value_starts = "{[\"-0123456789tfn";
+    if (report.note != goes_on || report.offset < start || report.offset - start >= text.size() ||
+        value_starts.find(text[report.offset - start]) == std::string_view::npos) {
+        return {};
+    }
+    const std::string_view before = text.substr(0, report.offset - start);
+    const std::size_t value_end = before.find_last_not_of(" \t\r\n");
+    const std::string_view between =
+        value_end == std::string_view::npos ? before : before.substr(value_end + 1);
+    return between.find_first_of("\r\n") == std::string_view::npos
+               ? std::string()
+               : " (the text looks like JSON Lines: try --lines)";
+}
+
 // The line is cut to a window around the failure on long (minified) lines, or where the text
 // at hand ends; tabs before the caret are kept so that it lines up. The line is written byte
 // for byte, NUL bytes included.

@@ -1,5 +1,6 @@
 #include "document_modes.hpp"
 
+#include "color_buffer.hpp"
 #include "descriptor_input.hpp"
 #include "diagnostics.hpp"
 #include "file_output.hpp"
@@ -87,12 +88,13 @@ Read read_document(const std::string& name, json::ParseOptions options, bool kee
 }
 
 // Where the text goes: standard output (no path), a file written as it is (a device, a FIFO),
-// or a file replaced once everything is written.
+// or a file replaced once everything is written; coloured when `color` says so.
 class Destination {
   public:
-    Destination(const std::string& path, Replacement::Target target)
+    Destination(const std::string& path, Replacement::Target target, bool color)
         : name(path.empty() ? "standard output" : path), descriptor(open(path, target)),
-          buffer(descriptor), out(&buffer) {}
+          buffer(descriptor), colors(buffer),
+          out(color ? static_cast<std::streambuf*>(&colors) : &buffer) {}
     ~Destination() {
         if (owned) {
             ::close(descriptor);
@@ -102,6 +104,8 @@ class Destination {
     Destination& operator=(const Destination&) = delete;
 
     std::ostream& stream() { return out; }
+    // Where text that is not JSON goes, around the colours.
+    std::streambuf& text() { return buffer; }
 
     // Hands on what is written so far, so that a message that follows comes after it where
     // both go to one terminal; a failure is kept for finish().
@@ -148,28 +152,35 @@ class Destination {
     bool owned = false;
     int descriptor;
     DescriptorBuffer buffer;
+    ColorBuffer colors;
     std::ostream out;
 };
 
-// Writes `value` and a newline; false (after saying why) when --ascii cannot write one of its
-// strings.
-bool write_value(std::ostream& out, const json::Value& value, const json::WriteOptions& options,
+// Writes `value` and a newline, a string as its text with --raw; false (after saying why) when
+// --ascii cannot write one of its strings.
+bool write_value(Destination& destination, const json::Value& value, const DocumentRun& run,
                  const std::string& where) {
+    if (run.raw && value.is_string()) {
+        const std::string& text = value.as_string();
+        destination.text().sputn(text.data(), static_cast<std::streamsize>(text.size()));
+        destination.stream().put('\n');
+        return true;
+    }
     std::string text;
     try {
-        text = json::serialize(value, options);
+        text = json::serialize(value, run.write_options);
     } catch (const std::invalid_argument& error) {
         std::fprintf(stderr, "%s: --ascii: %s\n", where.c_str(), error.what());
         return false;
     }
-    out.write(text.data(), static_cast<std::streamsize>(text.size())).put('\n');
+    destination.stream().write(text.data(), static_cast<std::streamsize>(text.size())).put('\n');
     return true;
 }
 
-// Patches the document `name` and writes it (or the value at the pointer) onto `out`, unless
-// that is null (--check).
+// Patches the document `name` and writes it (or the value at the pointer) onto `destination`,
+// unless that is null (--check).
 ExitStatus patch_document(const DocumentRun& run, const json::Value& patch, const std::string& name,
-                          std::ostream* out) {
+                          Destination* destination) {
     json::Value document;
     const bool keep_everything = run.in_place && !run.lossy &&
                                  (run.parse_options.allow_comments || run.parse_options.allow_bom);
@@ -192,7 +203,8 @@ ExitStatus patch_document(const DocumentRun& run, const json::Value& patch, cons
             return INVALID;
         }
     }
-    return out == nullptr || write_value(*out, *value, run.write_options, where) ? VALID : INVALID;
+    return destination == nullptr || write_value(*destination, *value, run, where) ? VALID
+                                                                                   : INVALID;
 }
 
 // Each file rewritten on its own, when its patch applies; or all onto one destination,
@@ -213,12 +225,11 @@ int run_patch(const DocumentRun& run) {
     const auto patch_onto = [&](const std::string& path, Replacement::Target target,
                                 const std::vector<std::string>& names) {
         try {
-            Destination destination(path, target);
+            Destination destination(path, target, run.color);
             int written = VALID;
             for (const std::string& name : names) {
                 destination.flush();
-                written =
-                    std::max<int>(written, patch_document(run, patch, name, &destination.stream()));
+                written = std::max<int>(written, patch_document(run, patch, name, &destination));
             }
             status = std::max(status, destination.finish(written == VALID) ? written : TROUBLE);
         } catch (const std::runtime_error& error) { // a refusal, or a failing system call
@@ -262,9 +273,8 @@ int run_diff(const DocumentRun& run, bool merge) {
         return status;
     }
     try {
-        Destination destination(run.output_path, Replacement::Target::EXISTING_OR_NEW);
-        const bool written =
-            write_value(destination.stream(), patch, run.write_options, shown_name(names[1]));
+        Destination destination(run.output_path, Replacement::Target::EXISTING_OR_NEW, run.color);
+        const bool written = write_value(destination, patch, run, shown_name(names[1]));
         return destination.finish(written) && written ? status : TROUBLE;
     } catch (const std::runtime_error& error) {
         complain(error.what());

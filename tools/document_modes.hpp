@@ -47,6 +47,8 @@ struct DocumentRun {
     bool in_place;
     bool check_only;
     bool lossy;
+    bool raw;   ///< --raw: a string written as its text
+    bool color; ///< the text coloured for a terminal
 };
 
 /// Runs --patch, --diff or --merge-diff; returns the exit status. --patch: 0 when every

@@ -10,6 +10,7 @@
 #include <cerrno>
 #include <charconv>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 #include <limits>
 #include <string>
@@ -89,6 +90,35 @@ void add_layout_options(CLI::App& app, Settings& settings) {
     compact->excludes(indent)->excludes(tab)->excludes(library);
 }
 
+// Adds the options for a person at a terminal: colours, and a string's own text. --raw
+// refuses --ascii: a string written raw keeps every character that --ascii promises to escape.
+void add_terminal_options(CLI::App& app, Settings& settings, std::string& color) {
+    app.add_option("--color", color,
+                   "colour the text for a terminal: auto (the default: when standard output is "
+                   "a terminal and NO_COLOR is not set), always or never")
+        ->type_name("WHEN")
+        ->check(CLI::IsMember({"auto", "always", "never"}));
+    app.add_flag("-r,--raw", settings.raw,
+                 "write a string (the document, or the value at --pointer) as its text, without "
+                 "quotes or escapes; other values as JSON")
+        ->excludes("--ascii");
+}
+
+// Whether the text is coloured: with --color=always; with auto, when it goes to standard
+// output, that is a terminal, and NO_COLOR is unset or empty (as no-color.org has it). --check
+// writes nothing, and --in-place writes files.
+bool colored(const std::string& color, const Settings& settings) {
+    if (color == "never" || settings.check_only || settings.in_place) {
+        return false;
+    }
+    if (color == "always") {
+        return true;
+    }
+    const char* const no_color = std::getenv("NO_COLOR");
+    return settings.output_path.empty() && ::isatty(STDOUT_FILENO) == 1 &&
+           (no_color == nullptr || *no_color == '\0');
+}
+
 // --max-depth: a positive number of levels, up to the largest the parser counts.
 std::string depth_problem(const std::string& text, std::size_t& depth) {
     constexpr std::size_t largest = std::numeric_limits<std::size_t>::max();
@@ -129,8 +159,8 @@ bool is_one_of(const std::string& path, const std::vector<std::string>& files) {
     });
 }
 
-// What the options ask that cannot be done, or an empty text.
-std::string usage_problem(const Settings& settings) {
+// What the options ask that cannot be done, or an empty text. `color` is --color's word.
+std::string usage_problem(const Settings& settings, const std::string& color) {
     if (settings.in_place &&
         std::find(settings.files.begin(), settings.files.end(), "-") != settings.files.end()) {
         return "--in-place needs files: it cannot rewrite standard input";
@@ -140,6 +170,14 @@ std::string usage_problem(const Settings& settings) {
     }
     if (settings.in_place && (settings.check_only || settings.pointer)) {
         return "--in-place rewrites whole files: it goes with neither --check nor --pointer";
+    }
+    if (settings.in_place && settings.raw) {
+        return "--raw writes a string as text that is not JSON: it cannot rewrite a JSON file "
+               "(--in-place)";
+    }
+    if (settings.in_place && color == "always") {
+        return "--color=always writes a terminal's colour codes: it cannot rewrite a JSON file "
+               "(--in-place)";
     }
     if (!settings.output_path.empty() && is_one_of(settings.output_path, settings.files)) {
         return "--output " + settings.output_path +
@@ -158,6 +196,8 @@ std::optional<ExitStatus> read_arguments(int argc, char** argv, Settings& settin
     app.set_help_flag("-h,--help", "show this help and exit");
     add_layout_options(app, settings);
     add_reading_options(app, settings);
+    std::string color = "auto";
+    add_terminal_options(app, settings, color);
     app.add_flag("--sort-keys", settings.sort_keys,
                  "write each object's members in byte order of their names (holds each "
                  "top-level object in memory)");
@@ -218,12 +258,13 @@ std::optional<ExitStatus> read_arguments(int argc, char** argv, Settings& settin
         problem = patch_usage_error(settings.patches, given_files);
     }
     if (problem.empty()) {
-        problem = usage_problem(settings);
+        problem = usage_problem(settings, color);
     }
     if (!problem.empty()) {
         complain(problem + " (try --help)");
         return TROUBLE;
     }
+    settings.color = colored(color, settings);
     if (!settings.patches.merge_patch.empty() &&
         !read_patch(settings.patches.merge_patch, settings.merge_patch.emplace())) {
         return TROUBLE;

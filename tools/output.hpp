@@ -4,9 +4,11 @@
 // The one way a document goes from the parser to the writer, and so the one place that decides
 // its verdict: --check runs it too, with the text thrown away.
 
+#include "color_buffer.hpp"
 #include "file_output.hpp"
 #include "key_sorter.hpp"
 #include "pointer_filter.hpp"
+#include "raw_string.hpp"
 #include "settings.hpp"
 
 #include <json/events.hpp>
@@ -36,19 +38,22 @@ class Discard : public std::streambuf {
     std::streamsize xsputn(const char*, std::streamsize count) override { return count; }
 };
 
-/// Writes documents, or the values at the pointer, onto one output as they are parsed.
+/// Writes documents, or the values at the pointer, onto one output as they are parsed, coloured
+/// with --color.
 class Output {
   public:
     /// `keeps_cut_text`: whether text written goes out for good (standard output, a device),
     /// not into a file that a failure discards.
     Output(const Settings& settings, int descriptor, std::string destination, bool keeps_cut_text)
         : settings(settings), destination(std::move(destination)), keeps_cut_text(keeps_cut_text),
-          buffer(descriptor), stream(&buffer), discarding(&discarded) {}
+          buffer(descriptor), colors(buffer),
+          stream(settings.color ? static_cast<std::streambuf*>(&colors) : &buffer),
+          discarding(&discarded) {}
 
     /// Parses one document with `parse`, called with the handler of its events, and writes it
     /// and a newline (with --check, into nothing). A document that fails is taken back, unless
     /// more of its text than the buffer holds went out: then what went out stays, ended by a
-    /// newline, and the result says so.
+    /// newline (and the colour it was in), and the result says so.
     template <typename Parse>
     DocumentResult document(Parse&& parse) {
         std::ostream& out = settings.check_only ? discarding : stream;
@@ -59,7 +64,7 @@ class Output {
         } catch (const std::invalid_argument& error) { // --ascii and a string that is not UTF-8
             result.unwritable = error.what();
         } catch (...) {
-            buffer.abandon_document();
+            take_back();
             stream.clear();
             throw;
         }
@@ -67,7 +72,7 @@ class Output {
         out.clear(out.rdstate() & ~std::ios::failbit);
         if (result.written()) {
             out.put('\n');
-        } else if (!buffer.abandon_document()) {
+        } else if (!take_back()) {
             stream.put('\n');
             result.cut = keeps_cut_text;
         }
@@ -84,9 +89,20 @@ class Output {
     bool finish();
 
   private:
-    // The document's events go to a Writer, through the pointer's filter and the key sorter
-    // when asked for. --check does not sort: the order of members changes no verdict, and it
-    // holds nothing but the text.
+    // Takes the document's text back, its colours with it: true. False when part of it went
+    // out already: then a colour that is on ends where its text stops.
+    bool take_back() {
+        if (buffer.abandon_document()) {
+            colors.forget();
+            return true;
+        }
+        colors.cut();
+        return false;
+    }
+
+    // The document's events go to a Writer, through the pointer's filter, the raw string's
+    // check and the key sorter when asked for. --check does not sort: the order of members
+    // changes no verdict, and it holds nothing but the text.
     template <typename Parse>
     DocumentResult verdict(Parse& parse, std::ostream& out) {
         json::Writer writer(out, settings.write_options);
@@ -97,14 +113,18 @@ class Output {
         return parse_into(writer, parse);
     }
 
+    // A string written raw goes around the colours (it is not JSON) to where the text goes.
     template <typename Sink, typename Parse>
     DocumentResult parse_into(Sink& sink, Parse& parse) {
+        std::streambuf* const text =
+            settings.check_only ? static_cast<std::streambuf*>(&discarded) : &buffer;
+        RawString<Sink> value(sink, settings.raw ? text : nullptr);
         DocumentResult result;
         if (!settings.pointer) {
-            result.report = parse(sink);
+            result.report = parse(value);
             return result;
         }
-        PointerFilter<Sink> filter(*settings.pointer, sink);
+        PointerFilter<RawString<Sink>> filter(*settings.pointer, value);
         result.report = parse(filter);
         if (result.report) {
             result.pointer_problem = filter.problem();
@@ -116,6 +136,7 @@ class Output {
     std::string destination;
     bool keeps_cut_text;
     DescriptorBuffer buffer;
+    ColorBuffer colors; // used with --color only
     std::ostream stream;
     Discard discarded;
     std::ostream discarding;

@@ -31,14 +31,16 @@ void report_located(const Source& source, const std::string& name, std::size_t l
     source.show(report);
 }
 
-// Reports a failed parse. Where --in-place must keep everything, the text was parsed without
-// comments and byte order marks: if it parses with them, the first of them is where the first
-// parse failed, and it is what the rewrite would drop.
+// Reports a failed parse, with a hint where the text may be JSON Lines. Where --in-place must
+// keep everything, the text was parsed without comments and byte order marks: if it parses
+// with them, the first of them is where the first parse failed, and it is what the rewrite
+// would drop.
 template <typename Source>
 void report_parse_failure(const Source& source, const std::string& name, std::size_t line,
                           const json::ParseReport& report, const Settings& settings) {
     if (!in_place_keeps_everything(settings)) {
-        report_located(source, name, line, report, failure_message(report));
+        report_located(source, name, line, report,
+                       failure_message(report) + source.lines_hint(report));
         return;
     }
     auto again = source.again();
@@ -51,7 +53,8 @@ void report_parse_failure(const Source& source, const std::string& name, std::si
                              "that)"
                            : "--in-place would drop this comment (add --lossy to allow that)");
     } else {
-        report_located(again, name, line, with_all, failure_message(with_all));
+        report_located(again, name, line, with_all,
+                       failure_message(with_all) + again.lines_hint(with_all));
     }
 }
 
@@ -212,7 +215,8 @@ ExitStatus run(const Settings& settings) {
         return static_cast<ExitStatus>(run_document_mode(
             {settings.patches, settings.files, settings.parse_options, settings.write_options,
              settings.pointer ? &*settings.pointer : nullptr, settings.output_path,
-             settings.in_place, settings.check_only, settings.lossy}));
+             settings.in_place, settings.check_only, settings.lossy, settings.raw,
+             settings.color}));
     }
     if (settings.in_place) {
         ExitStatus status = VALID;

@@ -34,6 +34,8 @@ struct Settings {
     bool in_place = false;
     bool lossy = false;
     bool sort_keys = false;
+    bool raw = false;                     // --raw: a string written as its text
+    bool color = false;                   // --color, as it turned out for the output
     std::optional<json::Pointer> pointer; // --pointer
     std::string output_path;
     Layout layout;

@@ -35,6 +35,12 @@ class StreamSource {
     /// The same file read again from its start (only a regular file, as --in-place takes, can).
     StreamSource again() const { return StreamSource(name); }
 
+    /// See lines_hint(), looked for in the pieces kept.
+    std::string lines_hint(const json::ParseReport& report) const {
+        const auto kept = input.kept(0, report.offset + 1);
+        return jsonfmt::lines_hint(kept.text, kept.start, report);
+    }
+
     /// The failing line, as far as the pieces kept around the failure hold it.
     void show(const json::ParseReport& report) const {
         const std::size_t before = std::min(report.offset, SHOWN_BEFORE);
@@ -60,6 +66,9 @@ struct LineSource {
     }
 
     LineSource again() const { return *this; }
+
+    /// Nothing: this is JSON Lines already.
+    std::string lines_hint(const json::ParseReport&) const { return {}; }
 
     void show(const json::ParseReport& report) const { show_failure_line(text, 0, report); }
 };
