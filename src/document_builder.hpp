@@ -88,13 +88,15 @@ class DocumentBuilder {
         return close();
     }
 
-    /// Hands the finished document to `out`, without a copy.
+    /// Hands the finished document to `out`, without a copy, and leaves the stacks empty for
+    /// another document (a record reader builds one after another).
     void take(Value& out) {
         std::optional<Value> document;
         adopt(pending.back(), [&document](auto&& initial) -> Value& {
             return document.emplace(std::forward<decltype(initial)>(initial));
         });
         out.swap(*document);
+        release_children(OpenContainer{});
     }
 
     /// Puts a refusal of the document in `report`, see DocumentRefusal.
