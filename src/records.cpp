@@ -10,6 +10,7 @@
 #include <new>
 #include <optional>
 #include <string_view>
+#include <utility>
 
 namespace json {
 
@@ -75,7 +76,9 @@ class RecordSplitter {
     // A value is complete: a record, when it lies at the records' depth.
     bool completed() {
         if (depth == record_depth) {
-            builder.take(finished.emplace_back());
+            builder.take_into([this](auto&& initial) -> Value& {
+                return finished.emplace_back(std::forward<decltype(initial)>(initial));
+            });
         }
         return true;
     }
