@@ -14,8 +14,9 @@ namespace json {
 
 /// Reads records from a std::istream one at a time, each handed over as a Value, with the
 /// grammar of json::parse, in memory bounded by the largest record and a piece of the text: the
-/// stream is read in pieces of 64 KiB, and the records a piece completes wait for next() (at
-/// most a few dozen bytes each for every byte of the piece). What was handed over is not kept.
+/// stream is read in pieces of 64 KiB, and the records one piece completes wait for next() as
+/// Values (for the smallest records, such as `0` or `{}`, a few dozen times the piece's size).
+/// Nothing handed over is kept.
 ///
 ///     json::RecordReader reader(in);
 ///     json::Value record;
@@ -45,14 +46,13 @@ class JSONVALUE_API RecordReader {
         /// JSON texts one after another, each directly after the one before or after
         /// whitespace: JSON Lines (a text on each line) and concatenated JSON. Any JSON value
         /// is a record; a stream of whitespace alone has none. After a failure, next() goes
-        /// on with the text after the next line break (a line feed or a carriage return), so
-        /// that the bad line is skipped: the rest of its text is never read, records on it
-        /// after the failure included.
+        /// on with the text after the next line break (a line feed or a carriage return): the
+        /// rest of the bad line is skipped, records on it after the failure included.
         LINES,
     };
 
     /// A reader of the records of `in` laid out as `layout` says, parsed with `options`.
-    /// Reads nothing yet. Throws std::bad_alloc.
+    /// Reads nothing yet; constant time. Throws std::bad_alloc.
     explicit RecordReader(std::istream& in, const ParseOptions& options = {},
                           Layout layout = Layout::ARRAY);
     /// Throws nothing.
@@ -74,13 +74,13 @@ class JSONVALUE_API RecordReader {
     /// with its line, column and offset in the stream and, for a refusal (reject_duplicate_keys,
     /// exact_numbers, max_depth, ...), its Refusal, as json::parse reports them; a stream that
     /// cannot give the text fails as with json::parse(std::istream&). Before that, success.
-    /// Throws nothing.
+    /// Constant time; throws nothing.
     const ParseReport& report() const noexcept;
 
     /// Whether next() has nothing more to give: after the end of the records, after any failure
     /// with Layout::ARRAY, and with Layout::LINES after a failure of the stream itself or an
     /// exception, which no line break can be found after. A loop over the records of a JSON
-    /// Lines stream, skipping bad ones, runs while it is false. Throws nothing.
+    /// Lines stream, skipping bad ones, runs while it is false. Constant time; throws nothing.
     bool at_end() const noexcept;
 
   private:
