@@ -427,7 +427,7 @@ TEST(Records, MemoryDoesNotGrowWithTheStream) {
         EXPECT_TRUE(reader.report());
         EXPECT_EQ(read, records);
         EXPECT_EQ(ids, records * (records - 1) / 2);
-        EXPECT_LT(most_late, most_early + 64 * 1024);
+        EXPECT_LT(most_late, most_early + std::size_t{64} * 1024);
     }
 }
 
