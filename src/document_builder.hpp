@@ -89,10 +89,17 @@ class DocumentBuilder {
     /// Hands the finished document to `out`, without a copy.
     void take(Value& out) {
         std::optional<Value> document;
-        adopt(pending.back(), [&document](auto&& initial) -> Value& {
+        take_into([&document](auto&& initial) -> Value& {
             return document.emplace(std::forward<decltype(initial)>(initial));
         });
         out.swap(*document);
+    }
+    /// Hands the finished document to the Value that `place` constructs, as adopt() does, and
+    /// leaves the stacks empty for another document (a record reader builds one after another).
+    template <typename Place>
+    void take_into(Place place) {
+        adopt(pending.back(), place);
+        release_children(OpenContainer{});
     }
 
     /// Puts a refusal of the document in `report`, see DocumentRefusal.

@@ -2,10 +2,13 @@
 
 #include <cstdlib>
 
+#include <malloc.h>
+
 namespace {
 
 // Plain counters: the tests that use them run on one thread.
 std::size_t live = 0;
+std::size_t live_size = 0; // bytes of the live blocks, as malloc_usable_size counts them
 std::size_t made = 0;
 std::size_t fail_at = 0; // absolute number of the allocation to fail; 0 for none
 bool fail_after = false; // whether every allocation after it fails too
@@ -28,12 +31,14 @@ void* operator new(std::size_t size) {
         throw std::bad_alloc();
     }
     ++live;
+    live_size += malloc_usable_size(block);
     return block;
 }
 
 void operator delete(void* block) noexcept {
     if (block != nullptr) {
         --live;
+        live_size -= malloc_usable_size(block);
         std::free(block);
     }
 }
@@ -46,6 +51,10 @@ namespace test_support {
 
 std::size_t live_blocks() {
     return live;
+}
+
+std::size_t live_bytes() {
+    return live_size;
 }
 
 std::size_t allocations_made() {

@@ -16,6 +16,9 @@ namespace test_support {
 /// Blocks allocated through operator new and not yet freed.
 std::size_t live_blocks();
 
+/// Bytes held by those blocks (their usable size, at least what was asked for).
+std::size_t live_bytes();
+
 /// Allocations made since the program started.
 std::size_t allocations_made();
 

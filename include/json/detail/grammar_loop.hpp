@@ -33,9 +33,12 @@ namespace json::detail {
 template <typename Handler>
 class Grammar {
   public:
-    /// The stack of open containers is kept in `workspace`.
-    Grammar(Handler& handler, const ParseOptions& options, Workspace& workspace)
-        : handler(handler), options(options), open_containers(workspace) {
+    /// The stack of open containers is kept in `workspace`. With `sequence`, the text is one
+    /// JSON text or more, each after the one before, directly or after whitespace (JSON Lines,
+    /// concatenated JSON): where one is complete, a value may follow.
+    Grammar(Handler& handler, const ParseOptions& options, Workspace& workspace,
+            bool sequence = false)
+        : handler(handler), options(options), sequence(sequence), open_containers(workspace) {
         open_containers.reserve(INITIAL_DEPTH);
     }
 
@@ -177,6 +180,7 @@ class Grammar {
 
     Handler& handler;
     const ParseOptions options;
+    const bool sequence;          // texts one after another, see the constructor
     std::size_t base = 0;         // offset of `begin` from the start of the first piece
     const char* begin = nullptr;  // the piece being read
     const char* cursor = nullptr; // the next byte to read
@@ -263,6 +267,9 @@ inline ParseResult Grammar<Handler>::step() {
     case Expect::AFTER_VALUE:
         return after_value();
     case Expect::END:
+        if (sequence) {
+            return value(); // the next text
+        }
         break;
     }
     return fail(ParseResult::UNEXPECTED_END_OF_INPUT, "the text goes on after the JSON value");

@@ -67,15 +67,16 @@ struct TextPosition {
     }
 };
 
-/// The report of a grammar that ended with `result`, a failure at its failure_offset().
+/// The report of a grammar that ended with `result`, a failure at its failure_offset() from
+/// `start`, where the grammar began reading.
 template <typename Grammar>
 ParseReport failure_report(ParseResult result, Grammar& grammar, const TextPosition& position,
-                           std::string_view rest) {
+                           std::string_view rest, std::size_t start = 0) {
     ParseReport report;
     report.result = result;
     report.refusal = grammar.refusal();
     report.note = grammar.take_note();
-    position.locate(report, rest, grammar.failure_offset());
+    position.locate(report, rest, start + grammar.failure_offset());
     return report;
 }
 
@@ -102,37 +103,69 @@ class JSONVALUE_API StreamPieces {
     const char* failure_note = nullptr;
 };
 
-/// Feeds `grammar` the text of `in` piece by piece and reports the outcome. Memory: the open
-/// containers, the longest token and one piece, never the whole text.
-template <typename Grammar>
-ParseReport feed_stream(std::istream& in, Grammar& grammar, TextPosition& position,
-                        std::string& rest) {
-    constexpr std::size_t piece = std::size_t{64} * 1024;
-    StreamPieces pieces(in);
-    std::size_t asked = piece;
-    for (;;) {
-        const bool more = pieces.append(rest, asked);
-        if (pieces.failure() != nullptr) {
-            ParseReport report;
-            report.result = ParseResult::UNEXPECTED_END_OF_INPUT;
-            report.note = pieces.failure();
-            position.locate(report, rest, position.offset + rest.size());
-            return report;
+/// A stream read in pieces for grammars: the text read and not yet consumed, and where that
+/// rest starts in the stream. Memory: one piece and the longest token, never the whole text.
+class StreamFeed {
+  public:
+    explicit StreamFeed(std::istream& in) : pieces(in) {}
+
+    /// Reads another piece and feeds `grammar` the rest with it; the grammar began reading at
+    /// offset `start` of the stream. Returns Grammar::NEED_MORE while the grammar needs more
+    /// text, otherwise the outcome, with `report` set (a stream that failed included). Throws
+    /// what StreamPieces::append and the grammar's handler throw, and std::bad_alloc.
+    template <typename Grammar>
+    ParseResult feed(Grammar& grammar, ParseReport& report, std::size_t start = 0) {
+        const bool more = read();
+        if (failed()) {
+            report = stream_failure();
+            return report.result;
         }
         const ParseResult result = grammar.feed(rest.data(), rest.data() + rest.size(), !more);
         if (result != Grammar::NEED_MORE) {
-            return result == ParseResult::SUCCESS ? ParseReport()
-                                                  : failure_report(result, grammar, position, rest);
+            report = result == ParseResult::SUCCESS
+                         ? ParseReport()
+                         : failure_report(result, grammar, rest_start, rest, start);
+            return result;
         }
         // The rest of the piece is a token begun: it is read again with the next piece. A
         // token that takes many pieces makes them grow, so that it is read again only as
         // often as its length doubles.
         const std::size_t consumed = grammar.consumed();
-        position.advance(std::string_view(rest).substr(0, consumed));
-        rest.erase(0, consumed);
-        asked = consumed == 0 ? asked + rest.size() : piece;
+        drop(consumed);
+        asked = consumed == 0 ? asked + rest.size() : PIECE;
+        return result;
     }
-}
+
+    /// Appends the next piece to the rest; false when none follows (the stream ended, or
+    /// failed: failed() says so). Throws as StreamPieces::append.
+    bool read() { return pieces.append(rest, asked); }
+    /// Whether the stream gave no more text although it did not end.
+    bool failed() const { return pieces.failure() != nullptr; }
+    /// The report of that failure, placed just after the last byte read.
+    ParseReport stream_failure() const {
+        ParseReport report;
+        report.result = ParseResult::UNEXPECTED_END_OF_INPUT;
+        report.note = pieces.failure();
+        rest_start.locate(report, rest, rest_start.offset + rest.size());
+        return report;
+    }
+    /// Leaves the first `count` bytes of the rest behind.
+    void drop(std::size_t count) {
+        rest_start.advance(std::string_view(rest).substr(0, count));
+        rest.erase(0, count);
+    }
+    /// The text read and not yet consumed.
+    std::string_view unconsumed() const { return rest; }
+    /// Where it starts in the stream.
+    const TextPosition& position() const { return rest_start; }
+
+  private:
+    static constexpr std::size_t PIECE = std::size_t{64} * 1024;
+    StreamPieces pieces;
+    TextPosition rest_start;
+    std::string rest;
+    std::size_t asked = PIECE;
+};
 
 template <typename Handler, typename = void>
 struct explains_refusals : std::false_type {};
@@ -158,14 +191,15 @@ ParseReport run_parser(Handler& handler, const ParseOptions& options, Workspace&
     return report;
 }
 
-/// The same over the rest of `in`, read in pieces (see feed_stream).
+/// The same over the rest of `in`, read in pieces (see StreamFeed).
 template <typename Handler>
 ParseReport run_parser(Handler& handler, const ParseOptions& options, Workspace& workspace,
                        std::istream& in) {
     Grammar<Handler> grammar(handler, options, workspace);
-    TextPosition position;
-    std::string rest;
-    ParseReport report = feed_stream(in, grammar, position, rest);
+    StreamFeed feed(in);
+    ParseReport report;
+    while (feed.feed(grammar, report) == Grammar<Handler>::NEED_MORE) {
+    }
     if constexpr (explains_refusals<Handler>::value) {
         handler.explain(report);
     }
