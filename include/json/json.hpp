@@ -5,6 +5,7 @@
 // (from a document or from events), parsing, patches, and the version macros.
 #include <json/builders.hpp>
 #include <json/convert.hpp>
+#include <json/convert_options.hpp>
 #include <json/events.hpp>
 #include <json/parse.hpp>
 #include <json/parse_options.hpp>

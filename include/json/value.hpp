@@ -282,6 +282,10 @@ class JSONVALUE_API Value : public detail::ValueVariant {
     /// bring them in.
     template <typename T>
     T value_or(const std::string& key, const T& fallback) const;
+    /// As above, the member converted with json::value_to<T>(member, options): a struct
+    /// fallback for a config section, say, whose members may keep their defaults.
+    template <typename T>
+    T value_or(const std::string& key, const T& fallback, const ConvertOptions& options) const;
     /// The member named `key` as a std::string, or `fallback`: value_or<std::string>, so that
     /// a string literal (or any `const char*`) can be the fallback. Throws as value_or does.
     /// Needs no other header.
