@@ -7,6 +7,7 @@
 #include <json/detail/export.hpp>
 
 #include <cstddef>
+#include <limits>
 #include <string>
 
 namespace json {
@@ -50,6 +51,11 @@ JSONVALUE_API const char* get_parse_result_description(ParseResult result);
 struct ParseOptions {
     /// Arrays and objects nested deeper than this are refused.
     std::size_t max_depth = 512;
+    /// A text longer than this many bytes is refused with Refusal::TOO_LARGE before anything
+    /// is built: a text given whole at once, without reading it; a stream as soon as more
+    /// bytes than this have been read from it, without reading further. The default, the
+    /// largest std::size_t, sets no limit.
+    std::size_t max_size = std::numeric_limits<std::size_t>::max();
     /// `//` comments to the end of the line and `/* ... */` comments wherever whitespace may
     /// stand. An unclosed `/*` or a lone `/` stays an error.
     bool allow_comments = false;
@@ -84,6 +90,7 @@ enum class Refusal {
     INEXACT_NUMBER,  ///< a number a double cannot hold exactly, with exact_numbers
     STOPPED,         ///< a handler of json::parse_events returned false
     BYTE_ORDER_MARK, ///< a UTF-8 byte order mark before the text, without allow_bom
+    TOO_LARGE,       ///< a text longer than ParseOptions::max_size
 };
 
 /// The detailed outcome of json::parse: the code, and for a failure where it happened and,
@@ -95,10 +102,11 @@ enum class Refusal {
 /// string is: a byte that cannot stand there), LONE_SURROGATE with INVALID_UNICODE_ESCAPE,
 /// DUPLICATE_KEY with MISSING_TRAILING_BRACE (the object cannot be completed as written) and
 /// INEXACT_NUMBER with INVALID_EXPONENT (the number's magnitude or precision is beyond a
-/// double's), BYTE_ORDER_MARK with MISSING_LEADING_DIGIT (no value starts with it). The
-/// position is that of the first byte of the ill-formed UTF-8 sequence, the backslash of the
-/// unpaired escape, the opening quote of the second member name, the first character of the
-/// number, or the start of the text.
+/// double's), BYTE_ORDER_MARK with MISSING_LEADING_DIGIT (no value starts with it), TOO_LARGE
+/// with UNEXPECTED_END_OF_INPUT (the text is not read to its end). The position is that of the
+/// first byte of the ill-formed UTF-8 sequence, the backslash of the unpaired escape, the
+/// opening quote of the second member name, the first character of the number, or the start
+/// of the text (a byte order mark; a text too large, refused as a whole).
 struct ParseReport {
     ParseResult result = ParseResult::SUCCESS; ///< the outcome
     std::size_t offset = 0;                    ///< byte offset of the failure in the text

@@ -102,22 +102,33 @@ class JSONVALUE_API StreamPieces {
     const char* failure_note = nullptr;
 };
 
-/// Feeds `grammar` the text of `in` piece by piece and reports the outcome. Memory: the open
-/// containers, the longest token and one piece, never the whole text.
+/// The refusal of a text longer than `max_size` bytes (ParseOptions::max_size), placed at its
+/// start: it is refused as a whole.
+JSONVALUE_API ParseReport too_large(std::size_t max_size);
+
+/// Feeds `grammar` the text of `in` piece by piece and reports the outcome; a text longer than
+/// `max_size` is refused once max_size + 1 bytes are read, without reading further. Memory:
+/// the open containers, the longest token and one piece, never the whole text.
 template <typename Grammar>
 ParseReport feed_stream(std::istream& in, Grammar& grammar, TextPosition& position,
-                        std::string& rest) {
+                        std::string& rest, std::size_t max_size) {
     constexpr std::size_t piece = std::size_t{64} * 1024;
     StreamPieces pieces(in);
     std::size_t asked = piece;
     for (;;) {
-        const bool more = pieces.append(rest, asked);
+        // The bytes read so far are at most max_size here (the loop ends when they are more),
+        // and at most one byte beyond max_size is asked for.
+        const std::size_t allowed = max_size - (position.offset + rest.size());
+        const bool more = pieces.append(rest, allowed < asked ? allowed + 1 : asked);
         if (pieces.failure() != nullptr) {
             ParseReport report;
             report.result = ParseResult::UNEXPECTED_END_OF_INPUT;
             report.note = pieces.failure();
             position.locate(report, rest, position.offset + rest.size());
             return report;
+        }
+        if (position.offset + rest.size() > max_size) {
+            return too_large(max_size);
         }
         const ParseResult result = grammar.feed(rest.data(), rest.data() + rest.size(), !more);
         if (result != Grammar::NEED_MORE) {
@@ -141,12 +152,16 @@ struct explains_refusals<
     Handler, std::void_t<decltype(std::declval<Handler&>().explain(std::declval<ParseReport&>()))>>
     : std::true_type {};
 
-/// Runs the grammar with `handler` over `text`, whole, and reports the outcome. A handler that
-/// refuses the document itself (the document builder, the validator) has an
-/// explain(ParseReport&) that puts its reason in the report.
+/// Runs the grammar with `handler` over `text`, whole, and reports the outcome; a text longer
+/// than ParseOptions::max_size is refused before the grammar sees it. A handler that refuses
+/// the document itself (the document builder, the validator) has an explain(ParseReport&) that
+/// puts its reason in the report.
 template <typename Handler>
 ParseReport run_parser(Handler& handler, const ParseOptions& options, Workspace& workspace,
                        std::string_view text) {
+    if (text.size() > options.max_size) {
+        return too_large(options.max_size);
+    }
     Grammar<Handler> grammar(handler, options, workspace);
     const ParseResult result = grammar.feed(text.data(), text.data() + text.size(), true);
     ParseReport report = result == ParseResult::SUCCESS
@@ -165,7 +180,7 @@ ParseReport run_parser(Handler& handler, const ParseOptions& options, Workspace&
     Grammar<Handler> grammar(handler, options, workspace);
     TextPosition position;
     std::string rest;
-    ParseReport report = feed_stream(in, grammar, position, rest);
+    ParseReport report = feed_stream(in, grammar, position, rest, options.max_size);
     if constexpr (explains_refusals<Handler>::value) {
         handler.explain(report);
     }
