@@ -1,10 +1,13 @@
-// The outcome codes' descriptions, and parsing into a document.
+// The outcome codes' descriptions, and parsing into a document: with a report, throwing, or
+// from a stream's extraction operator.
 #include "document_builder.hpp"
 
 #include <json/detail/run_parser.hpp>
 #include <json/parse.hpp>
 
 #include <istream>
+#include <stdexcept>
+#include <string>
 #include <string_view>
 
 namespace json {
@@ -62,6 +65,23 @@ ParseReport parse(std::istream& in, Value& out, const ParseOptions& options) {
         builder.take(out);
     }
     return report;
+}
+
+Value parse(std::string_view text, const ParseOptions& options) {
+    Value document;
+    const ParseReport report = parse(text, document, options);
+    if (!report) {
+        throw std::invalid_argument(std::to_string(report.line) + ":" +
+                                    std::to_string(report.column) + ": " + report.message());
+    }
+    return document;
+}
+
+std::istream& operator>>(std::istream& in, Value& value) {
+    if (!parse(in, value, ParseOptions())) {
+        in.setstate(std::ios::failbit);
+    }
+    return in;
 }
 
 } // namespace json

@@ -6,6 +6,7 @@
 #include <json/detail/export.hpp>
 #include <json/fwd.hpp>
 #include <json/parse_options.hpp>
+#include <json/value.hpp>
 
 #include <iosfwd>
 #include <string_view>
@@ -57,6 +58,20 @@ JSONVALUE_API ParseReport parse(std::istream& in, Value& out, const ParseOptions
 inline ParseResult parse(std::string_view text, Value& out) {
     return parse(text, out, ParseOptions()).result;
 }
+
+/// Parses `text` as the overloads above do and returns the document:
+/// `auto config = json::parse(text);`. Throws std::invalid_argument on a failure or refusal,
+/// whose what() is "LINE:COLUMN: " followed by ParseReport::message() ("1:5: Unexpected end of
+/// input"), and std::bad_alloc. The document is handed over without a copy.
+JSONVALUE_API Value parse(std::string_view text, const ParseOptions& options = {});
+
+/// Reads a document from the rest of `in` as json::parse(in, value, ParseOptions()) does: the
+/// whole rest of the stream is one JSON text, so `std::cin >> value` reads to the end of the
+/// input, and a second value after the first is a failure. On a failure or refusal sets
+/// failbit (which throws std::ios::failure if the caller enabled exceptions for it) and leaves
+/// `value` as it was; json::parse(in, value, options) tells why. Returns `in`. Throws what
+/// json::parse(std::istream&, ...) throws.
+JSONVALUE_API std::istream& operator>>(std::istream& in, Value& value);
 
 } // namespace json
 
