@@ -31,6 +31,7 @@ namespace json {
 /// - A comment or a trailing comma met while the options do not allow it fails as the
 ///   grammar says, with a note that names the option.
 /// - Text after the value is refused with UNEXPECTED_END_OF_INPUT and a note saying so.
+/// - A text longer than ParseOptions::max_size is refused before it is read.
 /// - Refusals of valid text set ParseReport::refusal; see ParseReport for their codes.
 ///
 /// Throws std::bad_alloc. When one allocation fails, `out` is left as it was. Handing the
@@ -49,7 +50,9 @@ JSONVALUE_API ParseReport parse(std::string_view text, Value& out, const ParseOp
 /// only) is an empty text. The stream ends with eofbit set; with badbit after its buffer
 /// threw, failbit when it was not readable. Exceptions the caller enabled on the stream for
 /// those bits propagate, except that with badbit enabled the buffer's own exception passes on
-/// (not std::ios::failure), as from the standard input functions. Throws std::bad_alloc.
+/// (not std::ios::failure), as from the standard input functions. A text longer than
+/// ParseOptions::max_size is refused once max_size + 1 bytes are read; the stream is left just
+/// after them. Throws std::bad_alloc.
 /// Memory: the document and a piece of 64 KiB of the text (with the longest token), never the
 /// whole text; the text is read in pieces as json::parse_events reads it.
 JSONVALUE_API ParseReport parse(std::istream& in, Value& out, const ParseOptions& options);
