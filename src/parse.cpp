@@ -67,14 +67,29 @@ ParseReport parse(std::istream& in, Value& out, const ParseOptions& options) {
     return report;
 }
 
-Value parse(std::string_view text, const ParseOptions& options) {
+namespace {
+
+// Parses `input` (a text or a stream) into a document that is returned, or throws with the
+// failure's place and message.
+template <typename Input>
+Value parse_or_throw(Input& input, const ParseOptions& options) {
     Value document;
-    const ParseReport report = parse(text, document, options);
+    const ParseReport report = parse(input, document, options);
     if (!report) {
         throw std::invalid_argument(std::to_string(report.line) + ":" +
                                     std::to_string(report.column) + ": " + report.message());
     }
     return document;
+}
+
+} // namespace
+
+Value parse(std::string_view text, const ParseOptions& options) {
+    return parse_or_throw(text, options);
+}
+
+Value parse(std::istream& in, const ParseOptions& options) {
+    return parse_or_throw(in, options);
 }
 
 std::istream& operator>>(std::istream& in, Value& value) {

@@ -136,11 +136,13 @@ TEST(Parser, Failures) {
     EXPECT_TRUE(parse(std::string(513, '[') + std::string(513, ']'), out, ParseOptions{513}));
 }
 
-// json::parse(text) returns the document, or throws with what() made of the report's place
-// and message; the overloads that take `out` still return their report or code.
+// json::parse(text or stream) returns the document, or throws with what() made of the report's
+// place and message; the overloads that take `out` still return their report or code.
 TEST(Parser, ReturningTheDocument) {
     static_assert(std::is_same_v<decltype(parse("[1]")), Value>);
     static_assert(std::is_same_v<decltype(parse("[1]", std::declval<Value&>())), R>);
+    std::istringstream stream(" [3] ");
+    EXPECT_EQ(parse(stream), Array{3});
     EXPECT_EQ(parse(R"([1, {"a": null}])"), (Array{1, Object{{"a", nullptr}}}));
     ParseOptions comments;
     comments.allow_comments = true;
@@ -151,10 +153,11 @@ TEST(Parser, ReturningTheDocument) {
     for (const auto& [text, options] : failures) {
         Value out;
         const ParseReport report = parse(text, out, options);
-        EXPECT_EQ(test_support::error_of([&] { parse(text, options); }),
-                  "invalid: " + std::to_string(report.line) + ":" + std::to_string(report.column) +
-                      ": " + report.message())
-            << text;
+        const std::string expected = "invalid: " + std::to_string(report.line) + ":" +
+                                     std::to_string(report.column) + ": " + report.message();
+        EXPECT_EQ(test_support::error_of([&] { parse(text, options); }), expected) << text;
+        std::istringstream in(text);
+        EXPECT_EQ(test_support::error_of([&] { parse(in, options); }), expected) << text;
     }
     EXPECT_EQ(test_support::error_of([] { parse(""); }),
               "invalid: 1:1: The given input sequence is empty");

@@ -68,12 +68,18 @@ inline ParseResult parse(std::string_view text, Value& out) {
 /// input"), and std::bad_alloc. The document is handed over without a copy.
 JSONVALUE_API Value parse(std::string_view text, const ParseOptions& options = {});
 
+/// Reads the rest of `in` as json::parse(in, out, options) does and returns the document:
+/// `auto config = json::parse(file);`. Throws std::invalid_argument "LINE:COLUMN: message" on
+/// a failure or refusal (a stream that was not readable included), what the stream throws as
+/// said there, and std::bad_alloc.
+JSONVALUE_API Value parse(std::istream& in, const ParseOptions& options = {});
+
 /// Reads a document from the rest of `in` as json::parse(in, value, ParseOptions()) does: the
 /// whole rest of the stream is one JSON text, so `std::cin >> value` reads to the end of the
 /// input, and a second value after the first is a failure. On a failure or refusal sets
 /// failbit (which throws std::ios::failure if the caller enabled exceptions for it) and leaves
-/// `value` as it was; json::parse(in, value, options) tells why. Returns `in`. Throws what
-/// json::parse(std::istream&, ...) throws.
+/// `value` as it was; json::parse(in, value, options) tells why, json::parse(in) throws it.
+/// Returns `in`. Throws what json::parse(std::istream&, ...) throws.
 JSONVALUE_API std::istream& operator>>(std::istream& in, Value& value);
 
 } // namespace json
