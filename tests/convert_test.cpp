@@ -313,7 +313,7 @@ TEST(Convert, OptionsForConfigStructs) {
 
 TEST(Convert, OptionsThroughValueOrAndUndefinedMembers) {
     Value document = json::Object{{"server", json::Object{{"port", 1}}}};
-    const json::ConvertOptions both = convert_options(true, true);
+    const json::ConvertOptions& both = json::CONFIG_RULES;
     const auto server = document.value_or("server", config::Server{}, both);
     EXPECT_EQ(server.host + ":" + std::to_string(server.port), "localhost:1");
     EXPECT_EQ(document.value_or("absent", config::Server{}, both).port, 8080);

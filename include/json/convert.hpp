@@ -33,6 +33,10 @@
 #include <json/detail/to_value.hpp>
 #include <json/value.hpp>
 
+// The macros that describe a struct or an enum, for the programs that convert them.
+#include <boost/describe/class.hpp>
+#include <boost/describe/enum.hpp>
+
 #include <optional>
 #include <string>
 

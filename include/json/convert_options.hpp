@@ -26,6 +26,11 @@ struct ConvertOptions {
     bool reject_unknown_members = false;
 };
 
+/// Both options, for reading a config file: what the file leaves out keeps the struct's
+/// default, and a key the struct does not know, which would otherwise be ignored silently
+/// while its member kept the default (a misspelt "portt"), is refused.
+inline constexpr ConvertOptions CONFIG_RULES = {true, true};
+
 } // namespace json
 
 #endif
