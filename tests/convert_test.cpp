@@ -239,9 +239,8 @@ TEST(Convert, DescribedStructsAndEnums) {
 // The JSON text of the Settings that `document` converts to with `options`, or the error.
 std::string settings_or_error(const Value& document, const json::ConvertOptions& options) {
     std::string text;
-    const std::string error = test_support::error_of([&] {
-        text = json::serialize(value_from(value_to<config::Settings>(document, options)));
-    });
+    const std::string error = test_support::error_of(
+        [&] { text = json::serialize(value_from(value_to<config::Settings>(document, options))); });
     return text.empty() ? error : text;
 }
 

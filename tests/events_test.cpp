@@ -194,18 +194,18 @@ TEST(Events, MaxSizeRefusesLongerTexts) {
     }
     records += "0]";
     for (const std::string& text : {std::string(R"({"a": [1, "two"]})"), records}) {
-        for (const std::size_t max_size : {text.size(), text.size() - 1, std::size_t{0},
-                                           std::size_t{1}, std::size_t{70'000}}) {
+        for (const std::size_t max_size :
+             {text.size(), text.size() - 1, std::size_t{0}, std::size_t{1}, std::size_t{70'000}}) {
             ParseOptions options;
             options.max_size = max_size;
             const bool refused = text.size() > max_size;
-            const std::string expected =
-                refused ? "19@0 1:1 8 the text is longer than the " + std::to_string(max_size) +
-                              " bytes ParseOptions::max_size allows"
-                        : report_of(ParseReport());
+            const std::string expected = refused ? "19@0 1:1 8 the text is longer than the " +
+                                                       std::to_string(max_size) +
+                                                       " bytes ParseOptions::max_size allows"
+                                                 : report_of(ParseReport());
             const std::string unread = refused ? text.substr(max_size + 1) : "";
-            const std::string label = std::to_string(text.size()) + " bytes, at most " +
-                                      std::to_string(max_size);
+            const std::string label =
+                std::to_string(text.size()) + " bytes, at most " + std::to_string(max_size);
 
             json::Value document = "kept";
             EXPECT_EQ(report_of(json::parse(text, document, options)), expected) << label;
