@@ -51,11 +51,6 @@ JSONVALUE_API const char* get_parse_result_description(ParseResult result);
 struct ParseOptions {
     /// Arrays and objects nested deeper than this are refused.
     std::size_t max_depth = 512;
-    /// A text longer than this many bytes is refused with Refusal::TOO_LARGE before anything
-    /// is built: a text given whole at once, without reading it; a stream as soon as more
-    /// bytes than this have been read from it, without reading further. The default, the
-    /// largest std::size_t, sets no limit.
-    std::size_t max_size = std::numeric_limits<std::size_t>::max();
     /// `//` comments to the end of the line and `/* ... */` comments wherever whitespace may
     /// stand. An unclosed `/*` or a lone `/` stays an error.
     bool allow_comments = false;
@@ -78,6 +73,11 @@ struct ParseOptions {
     /// `9007199254740993`, `0.10000000000000001` are refused). Costs nothing extra for numbers
     /// of at most 15 significant digits between 2.2250738585072014e-308 and 2^53.
     bool exact_numbers = false;
+    /// A text longer than this many bytes is refused with Refusal::TOO_LARGE before anything
+    /// is built: a text given whole at once, without reading it; a stream as soon as more
+    /// bytes than this have been read from it, without reading further. The default, the
+    /// largest std::size_t, sets no limit.
+    std::size_t max_size = std::numeric_limits<std::size_t>::max();
 };
 
 /// Why a text that is JSON (or that the options admit) was refused all the same.
