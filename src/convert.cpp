@@ -58,6 +58,10 @@ void throw_missing_member() {
     throw std::out_of_range("missing member");
 }
 
+void throw_unknown_member() {
+    throw std::invalid_argument("unknown member (the struct has no member of this name)");
+}
+
 void throw_wrong_size(std::size_t size, std::size_t found) {
     const std::string sizes = "expected " + std::string(traits<Array>::name) + " of " +
                               std::to_string(size) + " elements, found " + std::to_string(found);

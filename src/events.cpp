@@ -7,6 +7,7 @@
 #include <ios>
 #include <istream>
 #include <new>
+#include <string>
 
 namespace json {
 
@@ -94,6 +95,17 @@ class Validator {
 };
 
 } // namespace
+
+ParseReport too_large(std::size_t max_size) {
+    ParseReport report;
+    report.result = ParseResult::UNEXPECTED_END_OF_INPUT;
+    report.refusal = Refusal::TOO_LARGE;
+    report.line = 1;
+    report.column = 1;
+    report.note = "the text is longer than the " + std::to_string(max_size) +
+                  " bytes ParseOptions::max_size allows";
+    return report;
+}
 
 StreamPieces::StreamPieces(std::istream& in) : in(in) {}
 

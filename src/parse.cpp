@@ -1,10 +1,13 @@
-// The outcome codes' descriptions, and parsing into a document.
+// The outcome codes' descriptions, and parsing into a document: with a report, throwing, or
+// from a stream's extraction operator.
 #include "document_builder.hpp"
 
 #include <json/detail/run_parser.hpp>
 #include <json/parse.hpp>
 
 #include <istream>
+#include <stdexcept>
+#include <string>
 #include <string_view>
 
 namespace json {
@@ -62,6 +65,38 @@ ParseReport parse(std::istream& in, Value& out, const ParseOptions& options) {
         builder.take(out);
     }
     return report;
+}
+
+namespace {
+
+// Parses `input` (a text or a stream) into a document that is returned, or throws with the
+// failure's place and message.
+template <typename Input>
+Value parse_or_throw(Input& input, const ParseOptions& options) {
+    Value document;
+    const ParseReport report = parse(input, document, options);
+    if (!report) {
+        throw std::invalid_argument(std::to_string(report.line) + ":" +
+                                    std::to_string(report.column) + ": " + report.message());
+    }
+    return document;
+}
+
+} // namespace
+
+Value parse(std::string_view text, const ParseOptions& options) {
+    return parse_or_throw(text, options);
+}
+
+Value parse(std::istream& in, const ParseOptions& options) {
+    return parse_or_throw(in, options);
+}
+
+std::istream& operator>>(std::istream& in, Value& value) {
+    if (!parse(in, value, ParseOptions())) {
+        in.setstate(std::ios::failbit);
+    }
+    return in;
 }
 
 } // namespace json

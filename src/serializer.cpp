@@ -2,6 +2,11 @@
 
 #include "write_visitor.hpp"
 
+#include <algorithm>
+#include <ios>
+#include <limits>
+#include <ostream>
+
 namespace json {
 
 namespace {
@@ -60,7 +65,14 @@ std::string pretty_print(const Value& value) {
 }
 
 std::ostream& operator<<(std::ostream& out, const Value& value) {
-    return json::write(out, value, WriteOptions());
+    WriteOptions options;
+    if (const std::streamsize width = out.width(); width > 0) {
+        options.pretty = true;
+        options.indent = static_cast<unsigned>(
+            std::min<std::streamsize>(width, std::numeric_limits<unsigned>::max()));
+        out.width(0); // used up, as by the standard inserters
+    }
+    return json::write(out, value, options);
 }
 
 } // namespace json

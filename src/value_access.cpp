@@ -1,5 +1,5 @@
-// Checked access and lookups on a Value, and JSON Pointer lookups through json::Pointer. The const
-// overloads share the code of the others: they only read.
+// Checked access, subscripts and lookups on a Value, and JSON Pointer lookups through
+// json::Pointer. The const overloads share the code of the others: they only read.
 #include "messages.hpp"
 
 #include <json/convert.hpp>
@@ -8,6 +8,7 @@
 
 #include <stdexcept>
 #include <string>
+#include <utility>
 
 namespace json {
 
@@ -95,6 +96,19 @@ Value& Value::at(std::size_t index) {
 
 const Value& Value::at(std::size_t index) const {
     return const_cast<Value*>(this)->at(index);
+}
+
+Value& Value::operator[](const std::string& key) {
+    if (is_undefined()) {
+        // The Object is made with its member before this Value changes; the swap of an
+        // Undefined Value with an Object either happens whole or not at all.
+        Object members;
+        members.try_emplace(key);
+        Value made(std::move(members));
+        swap(made);
+        return boost::get<Object>(*this).begin()->second;
+    }
+    return as_object().try_emplace(key).first->second;
 }
 
 Value* Value::find_pointer(std::string_view pointer) {

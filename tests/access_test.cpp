@@ -1,4 +1,4 @@
-// Reading a Value: kinds, checked access, lookups, value_or, swap and the taking
+// Reading a Value: kinds, checked access, subscripts, lookups, value_or, swap and the taking
 // constructors.
 #include "support/allocation_failure.hpp"
 #include "support/errors.hpp"
@@ -88,6 +88,54 @@ TEST(Access, ValueOrConvertsOrFallsBack) {
     EXPECT_EQ(error_of([&] { config.value_or("name", 80); }),
               "invalid: /name: expected JSON number, found JSON string");
     EXPECT_THROW(Value(Array{}).value_or("port", 80), std::invalid_argument);
+}
+
+// A string subscript makes what is missing on the way; an index subscript makes nothing.
+TEST(Access, Subscripts) {
+    Value doc;
+    doc["a"] = 1;
+    doc["b"]["c"] = "x";
+    doc["b"]["d"] = Array{1, 2};
+    doc["b"]["d"][1] = true;
+    doc["e"];
+    EXPECT_EQ(json::serialize(doc), R"({"a":1,"b":{"c":"x","d":[1,true]}})");
+    EXPECT_EQ(doc.as_object().size(), 3u); // "e" is there, holding Undefined
+    EXPECT_TRUE(doc["e"].is_undefined() && !doc.contains("e"));
+    const Value& view = doc;
+    EXPECT_EQ(view.at("b").at("d")[0], 1);
+
+    const std::pair<Value, const char*> rows[] = {
+        {Value(nullptr), "invalid: expected JSON object, found JSON null"},
+        {Value(2.5f), "invalid: expected JSON object, found JSON number"},
+        {Value("k"), "invalid: expected JSON object, found JSON string"},
+        {Value(Array{}), "invalid: expected JSON object, found JSON array"},
+    };
+    for (const auto& [start, message] : rows) {
+        Value value = start;
+        EXPECT_EQ(error_of([&] { value["k"]; }), message);
+        EXPECT_EQ(value, start);
+    }
+    // The literal 0 is an index, never a null key; a string literal is a key.
+    Value both = Array{Object{{"k", 7}}};
+    EXPECT_EQ(both[0]["k"], 7);
+    EXPECT_EQ(error_of([&] { both[1]; }),
+              "missing: index 1 out of range for a JSON array of 1 elements");
+    EXPECT_EQ(error_of([&] { doc[0]; }), "invalid: expected JSON array, found JSON object");
+    EXPECT_EQ(both.as_array().size(), 1u);
+}
+
+// When an allocation fails, a subscript leaves the Value as it was: Undefined, or the Object
+// without the new member.
+TEST(Access, SubscriptKeepsTheValueWhenAnAllocationFails) {
+    const Value starts[] = {Value(), Value(Object{{"x", 1}})};
+    for (const Value& start : starts) {
+        for (const auto mode : {test_support::Exhaustion::ONE, test_support::Exhaustion::EVERY}) {
+            test_support::for_each_failing_allocation(
+                [&] { return start; },
+                [](Value& value) { value["a key longer than the small-string buffer"] = 1; },
+                [&](const Value& value) { EXPECT_EQ(value, start); }, mode);
+        }
+    }
 }
 
 // Big enough that a deep copy would show: an Array of Objects with long strings.

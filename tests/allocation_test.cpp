@@ -155,6 +155,19 @@ TEST(Allocation, FailedBuilderOperationsLeaveTheDocumentedState) {
     }
 }
 
+// json::parse(text) hands its document over as parse(text, out) does, without a copy.
+TEST(Allocation, ReturnedDocumentIsNotCopied) {
+    const std::string text = serialize(document());
+    Value out;
+    std::size_t before = allocations_made();
+    ASSERT_TRUE(parse(text, out, {}));
+    const std::size_t into_out = allocations_made() - before;
+    before = allocations_made();
+    const Value returned = parse(text);
+    EXPECT_EQ(allocations_made() - before, into_out);
+    EXPECT_EQ(returned, out);
+}
+
 // With one allocation failing `out` is left exactly as it was; with memory exhausted it may
 // also be left holding false, but never any part of the new document. Either way the caller
 // gets the std::bad_alloc.

@@ -66,6 +66,29 @@ bool operator==(const Point& a, const Point& b) {
 
 } // namespace shop
 
+namespace config {
+
+struct Endpoint {
+    std::string host = "localhost";
+    int port = 8080;
+};
+BOOST_DESCRIBE_STRUCT(Endpoint, (), (host, port))
+
+// Members of its own and inherited ones, each with a default.
+struct Server : Endpoint {
+    std::optional<int> timeout = 30;
+};
+BOOST_DESCRIBE_STRUCT(Server, (Endpoint), (timeout))
+
+struct Settings {
+    Server server;
+    std::vector<Server> replicas;
+    std::map<std::string, std::pair<Server, int>> named;
+};
+BOOST_DESCRIBE_STRUCT(Settings, (), (server, replicas, named))
+
+} // namespace config
+
 namespace {
 
 using json::Value;
@@ -211,6 +234,97 @@ TEST(Convert, DescribedStructsAndEnums) {
         EXPECT_EQ(failure<shop::Order>(document), row.message);
     }
     EXPECT_THROW(value_from(static_cast<shop::Currency>(7)), std::invalid_argument);
+}
+
+// The JSON text of the Settings that `document` converts to with `options`, or the error.
+std::string settings_or_error(const Value& document, const json::ConvertOptions& options) {
+    std::string text;
+    const std::string error = test_support::error_of(
+        [&] { text = json::serialize(value_from(value_to<config::Settings>(document, options))); });
+    return text.empty() ? error : text;
+}
+
+json::ConvertOptions convert_options(bool keep_defaults, bool reject_unknown) {
+    json::ConvertOptions options;
+    options.missing_members_keep_defaults = keep_defaults;
+    options.reject_unknown_members = reject_unknown;
+    return options;
+}
+
+const char* const UNKNOWN = "unknown member (the struct has no member of this name)";
+
+// Each text under each of the four combinations of the two options.
+TEST(Convert, OptionsForConfigStructs) {
+    const std::string unknown = UNKNOWN;
+    const struct {
+        const char* text;
+        std::string results[4]; // no option, keep defaults, reject unknown, both
+    } rows[] = {
+        // A null optional stays null; a missing one is nullopt, or keeps its default.
+        {R"({"server":{"host":"a","port":1,"timeout":null},"replicas":[{"host":"b","port":2}],)"
+         R"("named":{}})",
+         {R"({"named":{},"replicas":[{"host":"b","port":2,"timeout":null}],)"
+          R"("server":{"host":"a","port":1,"timeout":null}})",
+          R"({"named":{},"replicas":[{"host":"b","port":2,"timeout":30}],)"
+          R"("server":{"host":"a","port":1,"timeout":null}})",
+          R"({"named":{},"replicas":[{"host":"b","port":2,"timeout":null}],)"
+          R"("server":{"host":"a","port":1,"timeout":null}})",
+          R"({"named":{},"replicas":[{"host":"b","port":2,"timeout":30}],)"
+          R"("server":{"host":"a","port":1,"timeout":null}})"}},
+        // Missing members, inherited ones among them, inside sequences, maps and tuples.
+        {R"({"server":{"host":"a","port":2},"replicas":[{"port":3}],"named":{"n":[{},4]}})",
+         {"missing: /replicas/0/host: missing member",
+          R"({"named":{"n":[{"host":"localhost","port":8080,"timeout":30},4]},)"
+          R"("replicas":[{"host":"localhost","port":3,"timeout":30}],)"
+          R"("server":{"host":"a","port":2,"timeout":30}})",
+          "missing: /replicas/0/host: missing member",
+          R"({"named":{"n":[{"host":"localhost","port":8080,"timeout":30},4]},)"
+          R"("replicas":[{"host":"localhost","port":3,"timeout":30}],)"
+          R"("server":{"host":"a","port":2,"timeout":30}})"}},
+        // Unknown members: ignored, or refused where they stand before any member of their
+        // struct is converted; a map's keys are never unknown.
+        {R"({"server":{"portt":1},"named":{"any":[{},0]}})",
+         {"missing: /server/host: missing member",
+          R"({"named":{"any":[{"host":"localhost","port":8080,"timeout":30},0]},"replicas":[],)"
+          R"("server":{"host":"localhost","port":8080,"timeout":30}})",
+          "invalid: /server/portt: " + unknown, "invalid: /server/portt: " + unknown}},
+        {R"({"server":{},"replicas":[{},{"a/b":1}],"extra":true})",
+         {"missing: /server/host: missing member",
+          R"({"named":{},"replicas":[{"host":"localhost","port":8080,"timeout":30},)"
+          R"({"host":"localhost","port":8080,"timeout":30}],)"
+          R"("server":{"host":"localhost","port":8080,"timeout":30}})",
+          "invalid: /extra: " + unknown, "invalid: /extra: " + unknown}},
+        {R"({"server":{"host":"a","port":"80","a/b":1}})",
+         {"invalid: /server/port: expected JSON number, found JSON string",
+          "invalid: /server/port: expected JSON number, found JSON string",
+          "invalid: /server/a~1b: " + unknown, "invalid: /server/a~1b: " + unknown}},
+    };
+    for (const auto& row : rows) {
+        Value document;
+        ASSERT_TRUE(json::parse(row.text, document, {})) << row.text;
+        for (int flags = 0; flags < 4; ++flags) {
+            EXPECT_EQ(settings_or_error(document, convert_options(flags & 1, flags & 2)),
+                      row.results[flags])
+                << row.text << " with options " << flags;
+        }
+    }
+}
+
+TEST(Convert, OptionsThroughValueOrAndUndefinedMembers) {
+    Value document = json::Object{{"server", json::Object{{"port", 1}}}};
+    const json::ConvertOptions& both = json::CONFIG_RULES;
+    const auto server = document.value_or("server", config::Server{}, both);
+    EXPECT_EQ(server.host + ":" + std::to_string(server.port), "localhost:1");
+    EXPECT_EQ(document.value_or("absent", config::Server{}, both).port, 8080);
+    EXPECT_EQ(test_support::error_of([&] { document.value_or("server", config::Server{}); }),
+              "missing: /server/host: missing member");
+    // A member holding Undefined is absent: neither unknown nor there.
+    document.at("server").as_object()["ghost"] = Value();
+    document.at("server").as_object()["host"] = Value();
+    EXPECT_EQ(document.value_or("server", config::Server{}, both).host, "localhost");
+    document.at("server").as_object()["ghost"] = 0;
+    EXPECT_EQ(test_support::error_of([&] { document.value_or("server", config::Server{}, both); }),
+              std::string("invalid: /server/ghost: ") + UNKNOWN);
 }
 
 TEST(Convert, UserHooksComeFirst) {

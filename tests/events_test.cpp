@@ -1,5 +1,6 @@
 // Reading JSON as events: the events of each kind of token, a handler stopping anywhere, the
-// options, streams read a byte at a time, validation, and reformatting through the Writer.
+// options, streams read a byte at a time, validation, the size limit every reader applies, and
+// reformatting through the Writer.
 #include <json/json.hpp>
 
 #include <gtest/gtest.h>
@@ -8,6 +9,7 @@
 
 #include <filesystem>
 #include <fstream>
+#include <functional>
 #include <iterator>
 #include <sstream>
 #include <streambuf>
@@ -179,6 +181,50 @@ TEST(Events, TextStreamAndValidationAgree) {
             EXPECT_EQ(report_of(json::validate(text, options)), parsed) << path;
             std::istringstream again(text);
             EXPECT_EQ(report_of(json::validate(again, options)), parsed) << path;
+        }
+    }
+}
+
+// A text longer than max_size is refused as a whole by every reader: given whole, before the
+// grammar sees it; from a stream, once one byte more than max_size is read, and no further.
+TEST(Events, MaxSizeRefusesLongerTexts) {
+    std::string records = "[";
+    while (records.size() < 150'000) { // pieces of 64 KiB: the limit falls in the second
+        records += "1234567,\n";
+    }
+    records += "0]";
+    for (const std::string& text : {std::string(R"({"a": [1, "two"]})"), records}) {
+        for (const std::size_t max_size :
+             {text.size(), text.size() - 1, std::size_t{0}, std::size_t{1}, std::size_t{70'000}}) {
+            ParseOptions options;
+            options.max_size = max_size;
+            const bool refused = text.size() > max_size;
+            const std::string expected = refused ? "19@0 1:1 10 the text is longer than the " +
+                                                       std::to_string(max_size) +
+                                                       " bytes ParseOptions::max_size allows"
+                                                 : report_of(ParseReport());
+            const std::string unread = refused ? text.substr(max_size + 1) : "";
+            const std::string label =
+                std::to_string(text.size()) + " bytes, at most " + std::to_string(max_size);
+
+            json::Value document = "kept";
+            EXPECT_EQ(report_of(json::parse(text, document, options)), expected) << label;
+            EXPECT_EQ(document == "kept", refused) << label;
+            EXPECT_EQ(report_of(json::validate(text, options)), expected) << label;
+            Recorder recorder;
+            EXPECT_EQ(report_of(json::parse_events(text, recorder, options)), expected) << label;
+            EXPECT_EQ(recorder.count == 0, refused) << label;
+
+            const std::function<ParseReport(std::istream&)> stream_readers[] = {
+                [&](std::istream& in) { return json::parse(in, document, options); },
+                [&](std::istream& in) { return json::validate(in, options); },
+                [&](std::istream& in) { return json::parse_events(in, recorder, options); },
+            };
+            for (const auto& read : stream_readers) {
+                std::istringstream in(text);
+                EXPECT_EQ(report_of(read(in)), expected) << label;
+                EXPECT_EQ(std::string(std::istreambuf_iterator<char>(in), {}), unread) << label;
+            }
         }
     }
 }

@@ -1,5 +1,5 @@
 // Parsing from a std::istream: documents and their failures, streams that fail while they are
-// read or were never readable, and the exceptions a caller enabled on the stream.
+// read or were never readable, the exceptions a caller enabled on the stream, and operator>>.
 #include <json/json.hpp>
 
 #include <gtest/gtest.h>
@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <fstream>
 #include <functional>
+#include <iomanip>
 #include <sstream>
 #include <stdexcept>
 #include <streambuf>
@@ -156,6 +157,43 @@ TEST(ParseStream, StreamsThatGiveNoDocument) {
         EXPECT_EQ(out, "kept") << row.name;
     }
     EXPECT_TRUE(broken.bad());
+}
+
+// `in >> value` reads the rest of the stream as one document; on a failure it sets failbit and
+// leaves the Value alone. What `out << std::setw(N) << value` writes reads back equal.
+TEST(ParseStream, ExtractionOperator) {
+    const struct {
+        const char* text;
+        const char* read; // the compact text of the Value afterwards
+        bool fails;
+    } rows[] = {
+        {" {\"a\": [1, 2]}\n", R"({"a":[1,2]})", false},
+        {"[1] [2]", R"("kept")", true},
+        {"[1,", R"("kept")", true},
+        {"", R"("kept")", true},
+        {"// note\n1", R"("kept")", true},
+    };
+    for (const auto& row : rows) {
+        std::istringstream in(row.text);
+        Value value = "kept";
+        in >> value;
+        EXPECT_EQ(json::serialize(value), row.read) << row.text;
+        EXPECT_EQ(in.fail(), row.fails) << row.text;
+    }
+    std::istringstream strict("[1,]");
+    strict.exceptions(std::ios::failbit);
+    Value value;
+    EXPECT_THROW(strict >> value, std::ios::failure);
+    EXPECT_TRUE(value.is_undefined());
+
+    const Value document = json::Object{{"list", json::Array{1, "two", json::Object{}}}};
+    for (const int width : {0, 1, 4}) {
+        std::stringstream text;
+        text << std::setw(width) << document;
+        Value back;
+        EXPECT_TRUE(text >> back);
+        EXPECT_EQ(back, document) << text.str();
+    }
 }
 
 // With exceptions enabled for badbit, the stream buffer's own exception reaches the caller, as

@@ -1,3 +1,5 @@
+#include "support/errors.hpp"
+
 #include <json/json.hpp>
 
 #include <gtest/gtest.h>
@@ -11,6 +13,8 @@
 #include <map>
 #include <random>
 #include <sstream>
+#include <type_traits>
+#include <utility>
 #include <vector>
 
 namespace {
@@ -131,6 +135,33 @@ TEST(Parser, Failures) {
     Value out;
     EXPECT_EQ(parse(std::string(512, '[') + std::string(512, ']'), out), R::SUCCESS);
     EXPECT_TRUE(parse(std::string(513, '[') + std::string(513, ']'), out, ParseOptions{513}));
+}
+
+// json::parse(text or stream) returns the document, or throws with what() made of the report's
+// place and message; the overloads that take `out` still return their report or code.
+TEST(Parser, ReturningTheDocument) {
+    static_assert(std::is_same_v<decltype(parse("[1]")), Value>);
+    static_assert(std::is_same_v<decltype(parse("[1]", std::declval<Value&>())), R>);
+    std::istringstream stream(" [3] ");
+    EXPECT_EQ(parse(stream), Array{3});
+    EXPECT_EQ(parse(R"([1, {"a": null}])"), (Array{1, Object{{"a", nullptr}}}));
+    ParseOptions comments;
+    comments.allow_comments = true;
+    EXPECT_EQ(parse("[2] // two", comments), Array{2});
+    EXPECT_EQ(parse(std::string(R"("a\u0000b")")), std::string("a\0b", 3));
+    const std::pair<std::string, ParseOptions> failures[] = {
+        {"[1] // one", {}}, {"[1,\n 2,,]", comments}, {"{\"a\":1}\n\n  x", comments}};
+    for (const auto& [text, options] : failures) {
+        Value out;
+        const ParseReport report = parse(text, out, options);
+        const std::string expected = "invalid: " + std::to_string(report.line) + ":" +
+                                     std::to_string(report.column) + ": " + report.message();
+        EXPECT_EQ(test_support::error_of([&] { parse(text, options); }), expected) << text;
+        std::istringstream in(text);
+        EXPECT_EQ(test_support::error_of([&] { parse(in, options); }), expected) << text;
+    }
+    EXPECT_EQ(test_support::error_of([] { parse(""); }),
+              "invalid: 1:1: The given input sequence is empty");
 }
 
 // Options from letters: c comments, t trailing commas, u invalid UTF-8, s lone surrogates,

@@ -8,6 +8,7 @@
 #include <clocale>
 #include <cmath>
 #include <cstdlib>
+#include <iomanip>
 #include <locale>
 #include <sstream>
 
@@ -243,6 +244,23 @@ TEST(Serializer, NewlinesAndStreams) {
     buffer.broken = true;
     out.exceptions(ios_base::badbit);
     EXPECT_THROW(Serializer().write(out, Array{1}), ios_base::failure);
+}
+
+// A width set on the stream asks for pretty text with that many spaces per level, std::setw(4)
+// for json::pretty_print's text; the Value uses the width up, as the standard inserters do.
+TEST(Serializer, InsertionTakesTheWidthAsIndentation) {
+    const Value document = Object{{"a", Array{1, Object{}}}};
+    const std::pair<int, std::string> rows[] = {
+        {0, R"({"a":[1,{}]})"},
+        {-2, R"({"a":[1,{}]})"},
+        {1, "{\n \"a\":[\n  1,\n  {  }\n ]\n}"},
+        {4, pretty_print(document)},
+    };
+    for (const auto& [width, text] : rows) {
+        std::ostringstream out;
+        out << std::setw(width) << document << 7;
+        EXPECT_EQ(out.str(), text + "7") << width;
+    }
 }
 
 // Under global C and C++ locales with a comma as decimal separator, and a newline widened to

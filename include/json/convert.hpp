@@ -23,11 +23,19 @@
 // "/items/1/price: expected JSON number, found JSON string". A failure at the Value itself has
 // no pointer in front. A user's from_json may throw what it likes; std::invalid_argument and
 // std::out_of_range from it get the pointer in front too (as the same standard type).
+//
+// json::ConvertOptions (json/convert_options.hpp) lets a missing struct member keep its
+// default and refuses members a struct does not describe, for config files.
 
+#include <json/convert_options.hpp>
 #include <json/detail/conversion_traits.hpp>
 #include <json/detail/from_value.hpp>
 #include <json/detail/to_value.hpp>
 #include <json/value.hpp>
+
+// The macros that describe a struct or an enum, for the programs that convert them.
+#include <boost/describe/class.hpp>
+#include <boost/describe/enum.hpp>
 
 #include <optional>
 #include <string>
@@ -53,11 +61,13 @@ Value value_from(const T& value) {
 }
 
 /// The T that `value` represents; see the top of this header for the types it makes and the
-/// errors it reports. Linear in the size of `value`. Throws std::invalid_argument and
-/// std::out_of_range with the place of the failure, std::bad_alloc, and whatever a user's
-/// from_json throws; nothing leaks.
+/// errors it reports. `options` say how described structs take their members, at every level
+/// of T but inside a user's from_json, which gets none. Linear in the size of `value` (with
+/// reject_unknown_members, each member of a struct's Object is looked for among the struct's
+/// described members). Throws std::invalid_argument and std::out_of_range with the place of
+/// the failure, std::bad_alloc, and whatever a user's from_json throws; nothing leaks.
 template <typename T>
-T value_to(const Value& value) {
+T value_to(const Value& value, const ConvertOptions& options) {
     using detail::Category;
     constexpr Category category = detail::CATEGORY<T>;
     if constexpr (detail::hooks::has_from_json<T>::value) {
@@ -83,19 +93,19 @@ T value_to(const Value& value) {
         if (value.is_null() || value.is_undefined()) {
             return std::nullopt;
         }
-        return value_to<typename T::value_type>(value);
+        return value_to<typename T::value_type>(value, options);
     } else if constexpr (category == Category::ENUM) {
         return detail::to_enum<T>(value);
     } else if constexpr (category == Category::STRUCT) {
-        return detail::to_struct<T>(value);
+        return detail::to_struct<T>(value, options);
     } else if constexpr (category == Category::TUPLE) {
-        return detail::to_tuple<T>(value);
+        return detail::to_tuple<T>(value, options);
     } else if constexpr (category == Category::MAP) {
-        return detail::to_map<T>(value);
+        return detail::to_map<T>(value, options);
     } else if constexpr (category == Category::FIXED_SIZE) {
-        return detail::to_fixed_size<T>(value);
+        return detail::to_fixed_size<T>(value, options);
     } else if constexpr (category == Category::SEQUENCE) {
-        return detail::to_sequence<T>(value);
+        return detail::to_sequence<T>(value, options);
     } else {
         static_assert(detail::always_false<T>,
                       "no conversion from json::Value: describe the type with Boost.Describe or "
@@ -103,14 +113,26 @@ T value_to(const Value& value) {
     }
 }
 
+/// value_to with the default options: every described member but a std::optional one must be
+/// there, and members a struct does not describe are ignored.
 template <typename T>
-T Value::value_or(const std::string& key, const T& fallback) const {
+T value_to(const Value& value) {
+    return value_to<T>(value, ConvertOptions());
+}
+
+template <typename T>
+T Value::value_or(const std::string& key, const T& fallback, const ConvertOptions& options) const {
     static_cast<void>(as_object()); // throws when this is no Object
     const Value* const member = find(key);
     if (member == nullptr) {
         return fallback;
     }
-    return detail::below(key, [&] { return value_to<T>(*member); });
+    return detail::below(key, [&] { return value_to<T>(*member, options); });
+}
+
+template <typename T>
+T Value::value_or(const std::string& key, const T& fallback) const {
+    return value_or(key, fallback, ConvertOptions());
 }
 
 } // namespace json

@@ -51,8 +51,9 @@ struct NoOpHandler {
 /// (reject_duplicate_keys is for the handler to apply), and numbers as their literals
 /// (exact_numbers likewise). A handler that returns false stops the parse: the report says
 /// UNEXPECTED_END_OF_INPUT with Refusal::STOPPED, at the token that was being reported. A
-/// failure is reported after the events of every token before it. Linear in the length of
-/// the text; iterative. Throws std::bad_alloc and what the handler throws.
+/// failure is reported after the events of every token before it, but a text longer than
+/// ParseOptions::max_size is refused before any event. Linear in the length of the text;
+/// iterative. Throws std::bad_alloc and what the handler throws.
 template <typename Handler>
 ParseReport parse_events(std::string_view text, Handler& handler,
                          const ParseOptions& options = {}) {
@@ -63,7 +64,9 @@ ParseReport parse_events(std::string_view text, Handler& handler,
 /// As above, reading the rest of `in` in pieces of 64 KiB: memory is bounded by the nesting
 /// depth and the longest string or number, never by the length of the text. Offsets, lines
 /// and columns count from where the stream was. A stream that cannot give the text is a
-/// failure, reported as json::parse(std::istream&) reports it; the stream ends as it does.
+/// failure, reported as json::parse(std::istream&) reports it; the stream ends as it does. A
+/// text longer than ParseOptions::max_size is refused once max_size + 1 bytes are read; the
+/// events of the pieces read before that one have been reported by then.
 template <typename Handler>
 ParseReport parse_events(std::istream& in, Handler& handler, const ParseOptions& options = {}) {
     detail::Workspace workspace;

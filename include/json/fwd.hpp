@@ -21,6 +21,7 @@ using Array = std::vector<Value>;
 using Object = std::map<std::string, Value>;
 
 class Pointer;
+struct ConvertOptions;
 struct ParseOptions;
 struct ParseReport;
 struct WriteOptions;

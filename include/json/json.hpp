@@ -6,6 +6,7 @@
 // macros.
 #include <json/builders.hpp>
 #include <json/convert.hpp>
+#include <json/convert_options.hpp>
 #include <json/events.hpp>
 #include <json/parse.hpp>
 #include <json/parse_options.hpp>

@@ -6,6 +6,7 @@
 #include <json/detail/export.hpp>
 #include <json/fwd.hpp>
 #include <json/parse_options.hpp>
+#include <json/value.hpp>
 
 #include <iosfwd>
 #include <string_view>
@@ -30,6 +31,7 @@ namespace json {
 /// - A comment or a trailing comma met while the options do not allow it fails as the
 ///   grammar says, with a note that names the option.
 /// - Text after the value is refused with UNEXPECTED_END_OF_INPUT and a note saying so.
+/// - A text longer than ParseOptions::max_size is refused before it is read.
 /// - Refusals of valid text set ParseReport::refusal; see ParseReport for their codes.
 ///
 /// Throws std::bad_alloc. When one allocation fails, `out` is left as it was. Handing the
@@ -48,7 +50,9 @@ JSONVALUE_API ParseReport parse(std::string_view text, Value& out, const ParseOp
 /// only) is an empty text. The stream ends with eofbit set; with badbit after its buffer
 /// threw, failbit when it was not readable. Exceptions the caller enabled on the stream for
 /// those bits propagate, except that with badbit enabled the buffer's own exception passes on
-/// (not std::ios::failure), as from the standard input functions. Throws std::bad_alloc.
+/// (not std::ios::failure), as from the standard input functions. A text longer than
+/// ParseOptions::max_size is refused once max_size + 1 bytes are read; the stream is left just
+/// after them. Throws std::bad_alloc.
 /// Memory: the document and a piece of 64 KiB of the text (with the longest token), never the
 /// whole text; the text is read in pieces as json::parse_events reads it.
 JSONVALUE_API ParseReport parse(std::istream& in, Value& out, const ParseOptions& options);
@@ -57,6 +61,26 @@ JSONVALUE_API ParseReport parse(std::istream& in, Value& out, const ParseOptions
 inline ParseResult parse(std::string_view text, Value& out) {
     return parse(text, out, ParseOptions()).result;
 }
+
+/// Parses `text` as the overloads above do and returns the document:
+/// `auto config = json::parse(text);`. Throws std::invalid_argument on a failure or refusal,
+/// whose what() is "LINE:COLUMN: " followed by ParseReport::message() ("1:5: Unexpected end of
+/// input"), and std::bad_alloc. The document is handed over without a copy.
+JSONVALUE_API Value parse(std::string_view text, const ParseOptions& options = {});
+
+/// Reads the rest of `in` as json::parse(in, out, options) does and returns the document:
+/// `auto config = json::parse(file);`. Throws std::invalid_argument "LINE:COLUMN: message" on
+/// a failure or refusal (a stream that was not readable included), what the stream throws as
+/// said there, and std::bad_alloc.
+JSONVALUE_API Value parse(std::istream& in, const ParseOptions& options = {});
+
+/// Reads a document from the rest of `in` as json::parse(in, value, ParseOptions()) does: the
+/// whole rest of the stream is one JSON text, so `std::cin >> value` reads to the end of the
+/// input, and a second value after the first is a failure. On a failure or refusal sets
+/// failbit (which throws std::ios::failure if the caller enabled exceptions for it) and leaves
+/// `value` as it was; json::parse(in, value, options) tells why, json::parse(in) throws it.
+/// Returns `in`. Throws what json::parse(std::istream&, ...) throws.
+JSONVALUE_API std::istream& operator>>(std::istream& in, Value& value);
 
 } // namespace json
 

@@ -7,6 +7,7 @@
 #include <json/detail/export.hpp>
 
 #include <cstddef>
+#include <limits>
 #include <string>
 
 namespace json {
@@ -84,6 +85,11 @@ struct ParseOptions {
     /// say. Costs nothing extra for numbers of at most 15 significant digits between
     /// 2.2250738585072014e-308 and 2^53.
     bool exact_numbers = false;
+    /// A text longer than this many bytes is refused with Refusal::TOO_LARGE before anything
+    /// is built: a text given whole at once, without reading it; a stream as soon as more
+    /// bytes than this have been read from it, without reading further. The default, the
+    /// largest std::size_t, sets no limit.
+    std::size_t max_size = std::numeric_limits<std::size_t>::max();
 };
 
 /// Why a text that is JSON (or that the options admit) was refused all the same.
@@ -98,6 +104,7 @@ enum class Refusal {
     BYTE_ORDER_MARK, ///< a UTF-8 byte order mark before the text, without allow_bom
     COMMENT,         ///< a comment, without allow_comments
     TRAILING_COMMA,  ///< a comma before `]` or `}`, without allow_trailing_commas
+    TOO_LARGE,       ///< a text longer than ParseOptions::max_size
 };
 
 /// The detailed outcome of json::parse: the code, and for a failure where it happened and,
@@ -112,10 +119,12 @@ enum class Refusal {
 /// double's), STOPPED with UNEXPECTED_END_OF_INPUT, BYTE_ORDER_MARK with MISSING_LEADING_DIGIT
 /// (no value starts with it), COMMENT with the code of what the grammar expected where the
 /// comment starts, TRAILING_COMMA with MISSING_LEADING_DIGIT in an array and
-/// MISSING_LEADING_QUOTE in an object (what stands there instead of a value or a name). The
-/// position is that of the first byte of the ill-formed UTF-8 sequence, the backslash of the
-/// unpaired escape, the opening quote of the second member name, the first character of the
-/// number, the comment or the closing bracket, or the start of the text.
+/// MISSING_LEADING_QUOTE in an object (what stands there instead of a value or a name),
+/// TOO_LARGE with UNEXPECTED_END_OF_INPUT (the text is not read to its end). The position is
+/// that of the first byte of the ill-formed UTF-8 sequence, the backslash of the unpaired
+/// escape, the opening quote of the second member name, the first character of the number,
+/// the comment or the closing bracket, or the start of the text (a byte order mark; a text too
+/// large, refused as a whole).
 struct ParseReport {
     ParseResult result = ParseResult::SUCCESS; ///< the outcome
     std::size_t offset = 0;                    ///< byte offset of the failure in the text

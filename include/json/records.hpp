@@ -29,7 +29,8 @@ namespace json {
 /// reject_duplicate_keys and exact_numbers refuse the record that breaks them, max_depth
 /// counts from the record's own top level with Layout::LINES; with Layout::ARRAY the
 /// enclosing array is one level of it, so that the reader reads all the records of exactly
-/// the texts json::parse accepts, and fails where it fails, with the same report.
+/// the texts json::parse accepts, and fails where it fails, with the same report. max_size
+/// does not apply: a stream of records may be as long as it likes, since none of it is kept.
 ///
 /// Lines, columns and offsets count from where the stream was when the reader was made. The
 /// stream must outlive the reader; it is read as json::parse(std::istream&) reads it, and ends

@@ -106,7 +106,11 @@ JSONVALUE_API std::string serialize(const Value& value);
 /// The pretty text of `value`, with no newline at its end. Throws std::bad_alloc.
 JSONVALUE_API std::string pretty_print(const Value& value);
 
-/// Writes the compact text of `value` onto `out`, as Serializer::write does; returns `out`.
+/// Writes the text of `value` onto `out`, as Serializer::write does, and returns `out`:
+/// compact text, or, when the stream's width is set (`std::cout << std::setw(2) << value`),
+/// the library's pretty text indented by that many spaces per level, so that `std::setw(4)`
+/// gives the text of json::pretty_print. The width is set back to 0 before the text is
+/// written, as the standard inserters use it up. Throws what Serializer::write throws.
 JSONVALUE_API std::ostream& operator<<(std::ostream& out, const Value& value);
 
 /// The text of `value` laid out as `options` ask; `serialize(value, {})` is `serialize(value)`

@@ -260,6 +260,25 @@ class JSONVALUE_API Value : public detail::ValueVariant {
     Object& as_object();                  ///< The Object held.
     const Object& as_object() const;      ///< The Object held.
 
+    // Subscripts: a member made when missing, an element never.
+
+    /// The member named `key`, created when there is none: for building and editing
+    /// (`doc["a"] = 1; doc["b"]["c"] = "x";`). An Undefined Value first becomes an empty
+    /// Object. A created member holds Undefined, which is absent for every lookup and left out
+    /// by the writer until something is assigned to it (`doc["a"];` alone writes `{}`).
+    /// Logarithmic in the number of members. Throws std::invalid_argument naming both kinds
+    /// ("expected JSON object, found JSON number") when this is neither an Object nor
+    /// Undefined, and std::bad_alloc. Strong guarantee: on failure this Value is unchanged.
+    /// There is no const overload: on a const Value, at() reads without inserting.
+    Value& operator[](const std::string& key);
+    /// The element at `index`, as at(index): an Array never grows through it. Constant time.
+    /// Throws std::out_of_range naming the index and the size when it is out of range,
+    /// std::invalid_argument when this is no Array. `v[0]` is this overload, never the
+    /// member of a key converted from a null pointer.
+    Value& operator[](std::size_t index) { return at(index); }
+    /// @copydoc operator[](std::size_t)
+    const Value& operator[](std::size_t index) const { return at(index); }
+
     // Lookups. None of them inserts anything, and none allocates except to build a
     // std::string key longer than the small-string buffer. A member that holds Undefined is
     // absent for all of them, for value_or and for value_to (json/convert.hpp), as it is for
@@ -313,6 +332,10 @@ class JSONVALUE_API Value : public detail::ValueVariant {
     /// bring them in.
     template <typename T>
     T value_or(const std::string& key, const T& fallback) const;
+    /// As above, the member converted with json::value_to<T>(member, options): a struct
+    /// fallback for a config section, say, whose members may keep their defaults.
+    template <typename T>
+    T value_or(const std::string& key, const T& fallback, const ConvertOptions& options) const;
     /// The member named `key` as a std::string, or `fallback`: value_or<std::string>, so that
     /// a string literal (or any `const char*`) can be the fallback. Throws as value_or does.
     /// Needs no other header.

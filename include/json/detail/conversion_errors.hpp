@@ -28,6 +28,9 @@ namespace json::detail {
 /// Throws std::out_of_range "missing member".
 [[noreturn]] JSONVALUE_API void throw_missing_member();
 
+/// Throws std::invalid_argument "unknown member (the struct has no member of this name)".
+[[noreturn]] JSONVALUE_API void throw_unknown_member();
+
 /// Throws std::out_of_range "missing element (expected SIZE, found FOUND)" for too short an
 /// Array, std::invalid_argument "expected JSON array of SIZE elements, found FOUND" for too
 /// long a one.

@@ -3,6 +3,7 @@
 
 // How the conversions tell C++ types apart: the user's hooks, then the kinds of type they take.
 
+#include <json/convert_options.hpp>
 #include <json/value.hpp>
 
 #include <boost/describe/enumerators.hpp>
@@ -23,7 +24,7 @@ template <typename T>
 Value value_from(const T& value);
 
 template <typename T>
-T value_to(const Value& value);
+T value_to(const Value& value, const ConvertOptions& options);
 
 namespace detail {
 

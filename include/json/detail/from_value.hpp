@@ -85,22 +85,38 @@ T to_enum(const Value& in) {
     return value;
 }
 
+// Whether T describes a public member named `name`. Linear in the number of T's members.
 template <typename T>
-T to_struct(const Value& in) {
-    static_cast<void>(in.as_object()); // throws when `in` is no Object
+bool describes_member(std::string_view name) {
+    bool found = false;
+    boost::mp11::mp_for_each<described_members<T>>(
+        [&](auto member) { found = found || name == member.name; });
+    return found;
+}
+
+template <typename T>
+T to_struct(const Value& in, const ConvertOptions& options) {
+    const Object& members = in.as_object(); // throws when `in` is no Object
+    if (options.reject_unknown_members) {
+        for (const auto& [name, member] : members) {
+            if (!member.is_undefined() && !describes_member<T>(name)) {
+                below(name, [] { throw_unknown_member(); });
+            }
+        }
+    }
     T value{};
     boost::mp11::mp_for_each<described_members<T>>([&](auto member) {
         using Member = std::remove_reference_t<decltype(value.*member.pointer)>;
         const std::string_view name = member.name;
         const Value* const found = in.find(member.name);
-        if (found == nullptr) {
+        if (found != nullptr) {
+            value.*member.pointer = below(name, [&] { return value_to<Member>(*found, options); });
+        } else if (!options.missing_members_keep_defaults) { // else it keeps what T{} gave it
             if constexpr (is_optional<Member>::value) {
                 value.*member.pointer = std::nullopt;
             } else {
                 below(name, [] { throw_missing_member(); });
             }
-        } else {
-            value.*member.pointer = below(name, [&] { return value_to<Member>(*found); });
         }
     });
     return value;
@@ -117,45 +133,46 @@ inline void check_size(const Array& items, std::size_t size) {
 }
 
 template <typename T, std::size_t... I>
-T to_tuple(const Array& items, std::index_sequence<I...>) {
-    return T(below(I, [&] { return value_to<std::tuple_element_t<I, T>>(items[I]); })...);
+T to_tuple(const Array& items, const ConvertOptions& options, std::index_sequence<I...>) {
+    return T(below(I, [&] { return value_to<std::tuple_element_t<I, T>>(items[I], options); })...);
 }
 
 template <typename T>
-T to_tuple(const Value& in) {
+T to_tuple(const Value& in, const ConvertOptions& options) {
     constexpr std::size_t size = std::tuple_size_v<T>;
     check_size(in.as_array(), size);
-    return to_tuple<T>(in.as_array(), std::make_index_sequence<size>());
+    return to_tuple<T>(in.as_array(), options, std::make_index_sequence<size>());
 }
 
 template <typename T>
-T to_fixed_size(const Value& in) {
+T to_fixed_size(const Value& in, const ConvertOptions& options) {
     const Array& items = in.as_array();
     T result{};
     check_size(items, result.size());
     for (std::size_t i = 0; i < result.size(); ++i) {
-        result[i] = below(i, [&] { return value_to<typename T::value_type>(items[i]); });
+        result[i] = below(i, [&] { return value_to<typename T::value_type>(items[i], options); });
     }
     return result;
 }
 
 template <typename T>
-T to_sequence(const Value& in) {
+T to_sequence(const Value& in, const ConvertOptions& options) {
     T result;
     std::size_t index = 0;
     for (const Value& item : in.as_array()) {
-        result.insert(result.end(),
-                      below(index++, [&] { return value_to<typename T::value_type>(item); }));
+        result.insert(result.end(), below(index++, [&] {
+                          return value_to<typename T::value_type>(item, options);
+                      }));
     }
     return result;
 }
 
 template <typename T>
-T to_map(const Value& in) {
+T to_map(const Value& in, const ConvertOptions& options) {
     T result;
     for (const auto& member : in.as_object()) {
         result.emplace(member.first, below(member.first, [&] {
-                           return value_to<typename T::mapped_type>(member.second);
+                           return value_to<typename T::mapped_type>(member.second, options);
                        }));
     }
     return result;

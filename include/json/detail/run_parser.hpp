@@ -12,6 +12,7 @@
 #include <algorithm>
 #include <cstddef>
 #include <iosfwd>
+#include <limits>
 #include <string>
 #include <string_view>
 #include <type_traits>
@@ -103,11 +104,19 @@ class JSONVALUE_API StreamPieces {
     const char* failure_note = nullptr;
 };
 
+/// The refusal of a text longer than `max_size` bytes (ParseOptions::max_size), placed at its
+/// start: it is refused as a whole.
+JSONVALUE_API ParseReport too_large(std::size_t max_size);
+
 /// A stream read in pieces for grammars: the text read and not yet consumed, and where that
 /// rest starts in the stream. Memory: one piece and the longest token, never the whole text.
+/// A stream longer than `max_size` bytes is refused once max_size + 1 bytes are read, without
+/// reading further.
 class StreamFeed {
   public:
-    explicit StreamFeed(std::istream& in) : pieces(in) {}
+    explicit StreamFeed(std::istream& in,
+                        std::size_t max_size = std::numeric_limits<std::size_t>::max())
+        : pieces(in), max_size(max_size) {}
 
     /// Reads another piece and feeds `grammar` the rest with it; the grammar began reading at
     /// offset `start` of the stream. Returns Grammar::NEED_MORE while the grammar needs more
@@ -118,6 +127,10 @@ class StreamFeed {
         const bool more = read();
         if (failed()) {
             report = stream_failure();
+            return report.result;
+        }
+        if (rest_start.offset + rest.size() > max_size) {
+            report = too_large(max_size);
             return report.result;
         }
         const ParseResult result = grammar.feed(rest.data(), rest.data() + rest.size(), !more);
@@ -138,7 +151,12 @@ class StreamFeed {
 
     /// Appends the next piece to the rest; false when none follows (the stream ended, or
     /// failed: failed() says so). Throws as StreamPieces::append.
-    bool read() { return pieces.append(rest, asked); }
+    bool read() {
+        // At most max_size bytes are read before this (the feed ends when there are more), and
+        // at most one byte beyond max_size is asked for.
+        const std::size_t allowed = max_size - (rest_start.offset + rest.size());
+        return pieces.append(rest, allowed < asked ? allowed + 1 : asked);
+    }
     /// Whether the stream gave no more text although it did not end.
     bool failed() const { return pieces.failure() != nullptr; }
     /// The report of that failure, placed just after the last byte read.
@@ -165,6 +183,7 @@ class StreamFeed {
     TextPosition rest_start;
     std::string rest;
     std::size_t asked = PIECE;
+    std::size_t max_size;
 };
 
 template <typename Handler, typename = void>
@@ -174,12 +193,16 @@ struct explains_refusals<
     Handler, std::void_t<decltype(std::declval<Handler&>().explain(std::declval<ParseReport&>()))>>
     : std::true_type {};
 
-/// Runs the grammar with `handler` over `text`, whole, and reports the outcome. A handler that
-/// refuses the document itself (the document builder, the validator) has an
-/// explain(ParseReport&) that puts its reason in the report.
+/// Runs the grammar with `handler` over `text`, whole, and reports the outcome; a text longer
+/// than ParseOptions::max_size is refused before the grammar sees it. A handler that refuses
+/// the document itself (the document builder, the validator) has an explain(ParseReport&) that
+/// puts its reason in the report.
 template <typename Handler>
 ParseReport run_parser(Handler& handler, const ParseOptions& options, Workspace& workspace,
                        std::string_view text) {
+    if (text.size() > options.max_size) {
+        return too_large(options.max_size);
+    }
     Grammar<Handler> grammar(handler, options, workspace);
     const ParseResult result = grammar.feed(text.data(), text.data() + text.size(), true);
     ParseReport report = result == ParseResult::SUCCESS
@@ -196,7 +219,7 @@ template <typename Handler>
 ParseReport run_parser(Handler& handler, const ParseOptions& options, Workspace& workspace,
                        std::istream& in) {
     Grammar<Handler> grammar(handler, options, workspace);
-    StreamFeed feed(in);
+    StreamFeed feed(in, options.max_size);
     ParseReport report;
     while (feed.feed(grammar, report) == Grammar<Handler>::NEED_MORE) {
     }
