@@ -1,0 +1,67 @@
+#ifndef JSON_TESTS_DOCUMENTS_HPP
+#define JSON_TESTS_DOCUMENTS_HPP
+
+// The documents the tests read: texts that must parse, parse options by letter, and the files
+// of the parsing test suite and the benchmarks (JSON_TEST_PARSING_DIR, JSON_BENCH_DATA_DIR).
+
+#include <json/json.hpp>
+
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace test_support {
+
+/// Options from letters: c comments, t trailing commas, u invalid UTF-8, s lone surrogates,
+/// d duplicates refused, x exact numbers, b byte order mark skipped, i inexact integers rounded,
+/// o numbers beyond the range of double as infinities.
+inline json::ParseOptions options_from(std::string_view letters,
+                                       std::size_t max_depth = json::ParseOptions().max_depth) {
+    const auto has = [letters](char letter) { return letters.find(letter) != letters.npos; };
+    json::ParseOptions options;
+    options.max_depth = max_depth;
+    options.allow_comments = has('c');
+    options.allow_trailing_commas = has('t');
+    options.allow_invalid_utf8 = has('u');
+    options.allow_lone_surrogates = has('s');
+    options.reject_duplicate_keys = has('d');
+    options.exact_numbers = has('x');
+    options.allow_bom = has('b');
+    options.allow_inexact_integers = has('i');
+    options.allow_overflow = has('o');
+    return options;
+}
+
+/// What `text` parses to; a text that does not parse fails the test.
+inline json::Value parsed(std::string_view text, const json::ParseOptions& options = {}) {
+    json::Value out;
+    EXPECT_TRUE(json::parse(text, out, options)) << text.substr(0, 80);
+    return out;
+}
+
+inline std::string read_file(const std::filesystem::path& path) {
+    std::ifstream file(path, std::ios::binary);
+    return {std::istreambuf_iterator<char>(file), {}};
+}
+
+/// The parsing test suite: y_ files must parse, n_ files must fail, i_ files may do either.
+inline std::vector<std::filesystem::path> suite_files() {
+    const std::filesystem::directory_iterator files(JSON_TEST_PARSING_DIR);
+    return {begin(files), end(files)};
+}
+
+/// The benchmark documents; twitter.json's 64-bit ids parse only when rounding is asked for
+/// (options_from("i")).
+inline std::vector<std::filesystem::path> bench_files() {
+    const std::filesystem::path bench = JSON_BENCH_DATA_DIR;
+    return {bench / "twitter.json", bench / "citm_catalog.json", bench / "canada.json"};
+}
+
+} // namespace test_support
+
+#endif
