@@ -1,6 +1,7 @@
 // Reading a Value: kinds, checked access, subscripts, lookups, value_or, swap and the taking
 // constructors.
 #include "support/allocation_failure.hpp"
+#include "support/documents.hpp"
 #include "support/errors.hpp"
 
 #include <json/json.hpp>
@@ -17,12 +18,7 @@ using json::Object;
 using json::Value;
 using test_support::allocations_made;
 using test_support::error_of;
-
-Value parsed(const char* text) {
-    Value out;
-    EXPECT_TRUE(json::parse(text, out, {})) << text;
-    return out;
-}
+using test_support::parsed;
 
 TEST(Access, KindsLookupsAndTheirErrors) {
     const Value values[] = {Value(),       Value(nullptr), Value(true),     Value(1.5),
