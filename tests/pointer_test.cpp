@@ -1,5 +1,6 @@
 // JSON Pointers: reading, resolving against a document, building, and the messages that say
 // why a pointer finds nothing.
+#include "support/documents.hpp"
 #include "support/errors.hpp"
 
 #include <json/json.hpp>
@@ -15,12 +16,7 @@ using json::Kind;
 using json::Pointer;
 using json::Value;
 using test_support::error_of;
-
-Value parsed(const char* text) {
-    Value out;
-    EXPECT_TRUE(json::parse(text, out, {})) << text;
-    return out;
-}
+using test_support::parsed;
 
 TEST(Pointer, ResolvesEveryPointerOfTheRfcExample) {
     // The example document of RFC 6901, with every pointer it lists.
@@ -61,9 +57,6 @@ TEST(Pointer, ResolvesEveryPointerOfTheRfcExample) {
         EXPECT_EQ(doc.find_pointer(pointer), nullptr) << pointer;
         EXPECT_EQ(error_of([&] { doc.at_pointer(pointer); }), std::string("missing: ") + message);
     }
-    for (const char* malformed : {"foo", "/m~2n", "/foo~", "/bar/~x"}) {
-        EXPECT_THROW(doc.find_pointer(malformed), std::invalid_argument) << malformed;
-    }
 }
 
 TEST(Pointer, TakesTextApartIntoTokens) {
@@ -101,9 +94,11 @@ TEST(Pointer, RefusesWhatIsNoPointer) {
         {"a/b", "invalid: JSON Pointer \"a/b\" does not start with '/'"},
         {"/m~2n", "invalid: JSON Pointer \"/m~2n\" has a '~' not followed by '0' or '1'"},
         {"/a~", "invalid: JSON Pointer \"/a~\" has a '~' not followed by '0' or '1'"},
+        {"/b/~x", "invalid: JSON Pointer \"/b/~x\" has a '~' not followed by '0' or '1'"},
     };
     for (const auto& [text, message] : rows) {
         EXPECT_EQ(error_of([text = text] { Pointer{text}; }), message);
+        EXPECT_EQ(error_of([text = text] { Value().find_pointer(text); }), message);
     }
 }
 
