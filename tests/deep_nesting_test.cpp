@@ -1,5 +1,7 @@
 // Documents nested far deeper than any call stack could recurse through: copying, assigning,
 // comparing, writing, parsing and destroying them must not recurse once per level.
+#include "support/documents.hpp"
+
 #include <json/json.hpp>
 
 #include <gtest/gtest.h>
@@ -24,9 +26,7 @@ std::string nested(std::size_t depth, bool objects, const std::string& innermost
 }
 
 Value parsed(const std::string& text) {
-    Value out;
-    EXPECT_TRUE(parse(text, out, ParseOptions{text.size()}));
-    return out;
+    return test_support::parsed(text, ParseOptions{text.size()});
 }
 
 // Counts the flushes and drops the text: the pretty text of such a chain is tens of gigabytes
@@ -44,38 +44,32 @@ class FlushCounter : public std::streambuf {
     }
 };
 
-void expect_every_operation_survives(bool objects) {
-    const std::string text = nested(DEPTH, objects, "[]");
-    const Value deep = parsed(text);
-    Value copy = deep;
-    EXPECT_EQ(copy, deep);
-    Value assigned = Array{1};
-    assigned = deep;
-    Value other = "text";
-    other = deep;
-    assigned = other;
-    EXPECT_EQ(assigned, deep);
-    EXPECT_EQ(serialize(deep), text);
-    EXPECT_NE(deep, parsed(nested(DEPTH, objects, "[1]")));
+TEST(DeepNesting, ArraysAndObjectsHundredThousandDeep) {
+    for (const bool objects : {false, true}) {
+        const std::string text = nested(DEPTH, objects, "[]");
+        const Value deep = parsed(text);
+        Value copy = deep;
+        EXPECT_EQ(copy, deep);
+        Value assigned = Array{1};
+        assigned = deep;
+        Value other = "text";
+        other = deep;
+        assigned = other;
+        EXPECT_EQ(assigned, deep);
+        EXPECT_EQ(serialize(deep), text);
+        EXPECT_NE(deep, parsed(nested(DEPTH, objects, "[1]")));
 
-    // Every container but the innermost puts its child and its closing bracket on new lines.
-    FlushCounter counter;
-    std::ostream out(&counter);
-    Serializer serializer;
-    serializer.pretty_print(true);
-    serializer.write(out, deep);
-    EXPECT_EQ(counter.flushes, 2 * DEPTH);
+        // Every container but the innermost puts its child and its closing bracket on new lines.
+        FlushCounter counter;
+        std::ostream out(&counter);
+        Serializer serializer;
+        serializer.pretty_print(true);
+        serializer.write(out, deep);
+        EXPECT_EQ(counter.flushes, 2 * DEPTH);
 
-    copy = objects ? boost::get<Object>(copy)["k"] : boost::get<Array>(copy)[0];
-    EXPECT_EQ(serialize(copy), nested(DEPTH - 1, objects, "[]"));
-}
-
-TEST(DeepNesting, ArraysHundredThousandDeep) {
-    expect_every_operation_survives(false);
-}
-
-TEST(DeepNesting, ObjectsHundredThousandDeep) {
-    expect_every_operation_survives(true);
+        copy = objects ? boost::get<Object>(copy)["k"] : boost::get<Array>(copy)[0];
+        EXPECT_EQ(serialize(copy), nested(DEPTH - 1, objects, "[]"));
+    }
 }
 
 // Refused by the default depth limit, then parsed, written and released under a raised one.
