@@ -1,13 +1,13 @@
 // diff: the patch it writes for small pairs, and the round trip apply_patch(source, diff(source,
 // target)) == target (and the same with merge_diff) over the benchmark documents with seeded
 // random edits, and over documents nested far deeper than any call stack allows.
+#include "support/documents.hpp"
+
 #include <json/json.hpp>
 
 #include <gtest/gtest.h>
 
-#include <fstream>
 #include <random>
-#include <sstream>
 #include <string>
 #include <vector>
 
@@ -17,11 +17,7 @@ using json::Array;
 using json::Object;
 using json::Value;
 
-Value parsed(const std::string& text, const json::ParseOptions& options = {}) {
-    Value out;
-    EXPECT_TRUE(json::parse(text, out, options)) << text.substr(0, 80);
-    return out;
-}
+using test_support::parsed;
 
 // The patch either way turns one into the other.
 void expect_round_trip(const Value& source, const Value& target, const std::string& what) {
@@ -88,9 +84,9 @@ TEST(Diff, TakesMembersHoldingUndefinedForAbsent) {
     EXPECT_EQ(json::merge_diff(source, target), Object{});
 }
 
-// Seeded random edits of a document: scalars changed, members and elements added and removed,
-// values replaced by others of another kind. What is put in holds no null, so that the merge
-// patch expresses it too.
+// Seeded random edits of a document: a value picked anywhere is replaced by another of any kind,
+// or, in a container, a member or element is added or removed. What is put in holds no null, so
+// that the merge patch expresses it too.
 class Editor {
   public:
     explicit Editor(unsigned seed) : random(seed) {}
@@ -99,75 +95,51 @@ class Editor {
         for (int i = 0; i < edits; ++i) {
             std::vector<Value*> values{&document};
             for (std::size_t at = 0; at < values.size(); ++at) {
-                add_children(*values[at], values);
+                if (values[at]->is_array()) {
+                    for (Value& element : values[at]->as_array()) {
+                        values.push_back(&element);
+                    }
+                } else if (values[at]->is_object()) {
+                    for (auto& member : values[at]->as_object()) {
+                        values.push_back(&member.second);
+                    }
+                }
             }
             edit_one(*values[pick(values.size())]);
         }
     }
 
   private:
-    static void add_children(Value& value, std::vector<Value*>& values) {
-        if (value.is_array()) {
-            for (Value& element : value.as_array()) {
-                values.push_back(&element);
-            }
-        } else if (value.is_object()) {
-            for (auto& member : value.as_object()) {
-                values.push_back(&member.second);
-            }
-        }
-    }
-
     std::size_t pick(std::size_t count) {
         return std::uniform_int_distribution<std::size_t>(0, count - 1)(random);
     }
 
     Value fresh() {
-        switch (pick(6)) {
-        case 0:
-            return static_cast<double>(pick(1000)) / 8;
-        case 1:
-            return "text " + std::to_string(pick(100));
-        case 2:
-            return pick(2) == 0;
-        case 3:
-            return Array{1, pick(10), "x"};
-        case 4:
-            return Object{{"n", pick(10)}, {"list", Array{}}};
-        default:
-            return Object{};
-        }
+        const Value kinds[] = {static_cast<double>(pick(1000)) / 8,
+                               "text " + std::to_string(pick(100)),
+                               pick(2) == 0,
+                               Array{1, pick(10), "x"},
+                               Object{{"n", pick(10)}, {"list", Array{}}},
+                               Object{}};
+        return kinds[pick(std::size(kinds))];
     }
 
-    // A scalar or string changes; in a container, a member or element is added, removed or
-    // replaced by another value.
     void edit_one(Value& value) {
-        if (value.is_object() && !value.as_object().empty()) {
+        const std::size_t change = pick(3); // 0 adds, 1 removes, 2 replaces the value
+        if (change != 2 && value.is_object() && !value.as_object().empty()) {
             Object& members = value.as_object();
-            auto member =
-                std::next(members.begin(), static_cast<std::ptrdiff_t>(pick(members.size())));
-            switch (pick(3)) {
-            case 0:
+            if (change == 0) {
                 members.emplace("new " + std::to_string(pick(1000)), fresh());
-                break;
-            case 1:
-                members.erase(member);
-                break;
-            default:
-                member->second = fresh();
+            } else {
+                members.erase(std::next(members.begin(), static_cast<long>(pick(members.size()))));
             }
-        } else if (value.is_array() && !value.as_array().empty()) {
+        } else if (change != 2 && value.is_array() && !value.as_array().empty()) {
             Array& elements = value.as_array();
-            const auto at = elements.begin() + static_cast<std::ptrdiff_t>(pick(elements.size()));
-            switch (pick(3)) {
-            case 0:
+            const auto at = elements.begin() + static_cast<long>(pick(elements.size()));
+            if (change == 0) {
                 elements.insert(at, fresh());
-                break;
-            case 1:
+            } else {
                 elements.erase(at);
-                break;
-            default:
-                *at = fresh();
             }
         } else {
             value = fresh();
@@ -178,14 +150,10 @@ class Editor {
 };
 
 TEST(Diff, RoundTripsOverTheBenchmarkDocumentsWithRandomEdits) {
-    for (const char* name : {"twitter", "citm_catalog", "canada"}) {
-        std::ifstream file(std::string(JSON_BENCH_DATA_DIR) + "/" + name + ".json");
-        std::ostringstream text;
-        text << file.rdbuf();
-        // twitter.json has integers beyond 2^53: rounded, as asked by name.
-        json::ParseOptions rounding;
-        rounding.allow_inexact_integers = true;
-        const Value original = parsed(text.str(), rounding);
+    for (const auto& path : test_support::bench_files()) {
+        const std::string name = path.filename();
+        const Value original =
+            parsed(test_support::read_file(path), test_support::options_from("i"));
         ASSERT_TRUE(original.is_object()) << name;
         EXPECT_EQ(json::diff(original, original), Array{}) << name;
         for (unsigned seed = 1; seed <= 3; ++seed) {
