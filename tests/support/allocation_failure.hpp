@@ -7,9 +7,12 @@
 // that one, and check for leaks. Nothing is allocated ahead of the tests: a block that the
 // library keeps after an operation counts as a leak of that operation.
 
+#include <json/json.hpp>
+
 #include <cstddef>
 #include <gtest/gtest.h>
 #include <new>
+#include <utility>
 
 namespace test_support {
 
@@ -72,6 +75,34 @@ FailureRuns for_each_failing_allocation(Setup setup, Operation operation, Check 
             runs.allocations = n - 1;
             return runs;
         }
+    }
+}
+
+/// Runs `apply(document, patch)` on a copy of `before` once for every allocation it makes,
+/// with that allocation failing, and again with memory exhausted from it on: the document is
+/// left as it was, but for the one case the patch functions name: a top-level array made an
+/// object or the other way round (as `result` is to `before`), with memory exhausted, may leave
+/// false.
+template <typename Apply>
+void expect_patch_undone_when_memory_runs_out(const json::Value& before, const json::Value& patch,
+                                              const json::Value& result, Apply apply) {
+    const auto container = [](const json::Value& value) {
+        return value.is_array() || value.is_object();
+    };
+    const bool kind_changes =
+        before.which() != result.which() && container(before) && container(result);
+    for (const Exhaustion mode : {Exhaustion::ONE, Exhaustion::EVERY}) {
+        for_each_failing_allocation(
+            [&] { return std::make_pair(before, patch); },
+            [&apply](std::pair<json::Value, json::Value>& state) {
+                apply(state.first, state.second);
+            },
+            [&](const std::pair<json::Value, json::Value>& state) {
+                EXPECT_TRUE(state.first == before ||
+                            (kind_changes && mode == Exhaustion::EVERY && state.first == false))
+                    << json::serialize(patch) << " left " << json::serialize(state.first);
+            },
+            mode);
     }
 }
 
