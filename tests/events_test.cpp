@@ -1,18 +1,17 @@
 // Reading JSON as events: the events of each kind of token, a handler stopping anywhere, the
-// options, streams read a byte at a time, validation, the size limit every reader applies, and
-// reformatting through the Writer.
+// options, streams read a byte at a time, validation, and the size limit every reader applies.
+#include "support/documents.hpp"
+#include "support/reading.hpp"
+
 #include <json/json.hpp>
 
 #include <gtest/gtest.h>
 
 #include <sys/resource.h>
 
-#include <filesystem>
-#include <fstream>
 #include <functional>
 #include <iterator>
 #include <sstream>
-#include <streambuf>
 #include <string>
 #include <vector>
 
@@ -22,58 +21,14 @@ using json::ParseOptions;
 using json::ParseReport;
 using json::ParseResult;
 using json::Refusal;
-
-// Writes down every event as a word; stops when told to at the event numbered `stop_at`.
-struct Recorder {
-    std::string events;
-    std::size_t count = 0;
-    std::size_t stop_at = SIZE_MAX;
-
-    bool note(const std::string& event) {
-        events += event + " ";
-        return count++ != stop_at;
-    }
-    bool null() { return note("null"); }
-    bool boolean(bool value) { return note(value ? "true" : "false"); }
-    bool number(std::string_view literal) { return note("#" + std::string(literal)); }
-    bool string(std::string_view text) { return note("'" + std::string(text) + "'"); }
-    bool key(std::string_view name) { return note(std::string(name) + ":"); }
-    bool begin_array() { return note("["); }
-    bool end_array() { return note("]"); }
-    bool begin_object() { return note("{"); }
-    bool end_object() { return note("}"); }
-};
+using test_support::options_from;
+using test_support::Recorder;
+using test_support::report_text;
 
 std::string events_of(std::string_view text, const ParseOptions& options = {}) {
     Recorder recorder;
     const ParseReport report = json::parse_events(text, recorder, options);
     return report ? recorder.events : recorder.events + "@" + std::to_string(report.offset);
-}
-
-// A stream buffer that holds one byte of its text at a time and never says that more is
-// there, so that the reader takes the text in pieces of one byte and every token straddles
-// pieces.
-class OneByteAtATime : public std::streambuf {
-  public:
-    explicit OneByteAtATime(std::string text) : text(std::move(text)) {}
-
-  private:
-    int_type underflow() override {
-        if (next == text.size()) {
-            return traits_type::eof();
-        }
-        setg(&text[next], &text[next], &text[next] + 1);
-        ++next;
-        return traits_type::to_int_type(text[next - 1]);
-    }
-    std::string text;
-    std::size_t next = 0;
-};
-
-std::string report_of(const ParseReport& report) {
-    return std::to_string(static_cast<int>(report.result)) + "@" + std::to_string(report.offset) +
-           " " + std::to_string(report.line) + ":" + std::to_string(report.column) + " " +
-           std::to_string(static_cast<int>(report.refusal)) + " " + report.note;
 }
 
 TEST(Events, EachKindOfToken) {
@@ -98,22 +53,13 @@ TEST(Events, EachKindOfToken) {
 // The options act as in json::parse, but the two that concern a document: names and literals
 // are passed through.
 TEST(Events, Options) {
-    ParseOptions lenient;
-    lenient.allow_comments = true;
-    lenient.allow_trailing_commas = true;
-    lenient.allow_invalid_utf8 = true;
-    lenient.allow_lone_surrogates = true;
-    ParseOptions document_rules;
-    document_rules.reject_duplicate_keys = true;
-    document_rules.exact_numbers = true;
+    const ParseOptions lenient = options_from("ctus");
     EXPECT_EQ(events_of("[1, /* c */ 2, ] // end", lenient), "[ #1 #2 ] ");
     EXPECT_EQ(events_of("[\"\xFF\", \"\\udc00\"]", lenient), "[ '\xFF' '\xEF\xBF\xBD' ] ");
     EXPECT_EQ(events_of("[\"\xFF\"]"), "[ @2");
-    EXPECT_EQ(events_of(R"({"a": 1e400, "a": 0.10000000000000001})", document_rules),
+    EXPECT_EQ(events_of(R"({"a": 1e400, "a": 0.10000000000000001})", options_from("dx")),
               "{ a: #1e400 a: #0.10000000000000001 } ");
-    ParseOptions shallow;
-    shallow.max_depth = 2;
-    EXPECT_EQ(events_of("[[[]]]", shallow), "[ [ @2");
+    EXPECT_EQ(events_of("[[[]]]", options_from("", 2)), "[ [ @2");
 }
 
 // A handler that stops at each event in turn: the parse stops there, at that token.
@@ -138,21 +84,6 @@ TEST(Events, StoppedAtEveryEvent) {
 // report, on the conformance suite and the benchmark documents, with several option sets;
 // json::validate gives json::parse's report on every one of them, from text and from a stream.
 TEST(Events, TextStreamAndValidationAgree) {
-    const std::filesystem::path bench = JSON_BENCH_DATA_DIR;
-    std::vector<std::filesystem::path> files = {bench / "twitter.json", bench / "citm_catalog.json",
-                                                bench / "canada.json"};
-    for (const auto& entry : std::filesystem::directory_iterator(JSON_TEST_PARSING_DIR)) {
-        files.push_back(entry.path());
-    }
-    ParseOptions strict;
-    strict.reject_duplicate_keys = true;
-    strict.exact_numbers = true;
-    ParseOptions lenient;
-    lenient.allow_comments = true;
-    lenient.allow_trailing_commas = true;
-    lenient.allow_invalid_utf8 = true;
-    lenient.allow_lone_surrogates = true;
-    lenient.allow_bom = true;
     // Besides the files: line ends of every kind before a failure, byte order marks whole and
     // cut short.
     std::vector<std::pair<std::string, std::string>> texts = {
@@ -161,26 +92,28 @@ TEST(Events, TextStreamAndValidationAgree) {
         {"byte order mark alone", "\xEF\xBB\xBF"},
         {"byte order mark cut short", "\xEF\xBB"},
     };
-    for (const std::filesystem::path& path : files) {
-        std::ifstream file(path, std::ios::binary);
-        texts.emplace_back(path.string(), std::string{std::istreambuf_iterator<char>(file), {}});
+    for (const auto& files : {test_support::suite_files(), test_support::bench_files()}) {
+        for (const auto& path : files) {
+            texts.emplace_back(path.string(), test_support::read_file(path));
+        }
     }
     for (const auto& [path, text] : texts) {
-        for (const ParseOptions& options : {ParseOptions(), strict, lenient}) {
+        for (const char* letters : {"", "dx", "ctusb"}) {
+            const ParseOptions options = options_from(letters);
             Recorder from_text;
             const ParseReport text_report = json::parse_events(text, from_text, options);
             Recorder from_stream;
-            OneByteAtATime bytes(text);
+            test_support::InPieces bytes(text, 1);
             std::istream stream(&bytes);
             const ParseReport stream_report = json::parse_events(stream, from_stream, options);
             EXPECT_EQ(from_stream.events, from_text.events) << path;
-            EXPECT_EQ(report_of(stream_report), report_of(text_report)) << path;
+            EXPECT_EQ(report_text(stream_report), report_text(text_report)) << path;
 
             json::Value document;
-            const std::string parsed = report_of(json::parse(text, document, options));
-            EXPECT_EQ(report_of(json::validate(text, options)), parsed) << path;
+            const std::string parsed = report_text(json::parse(text, document, options));
+            EXPECT_EQ(report_text(json::validate(text, options)), parsed) << path;
             std::istringstream again(text);
-            EXPECT_EQ(report_of(json::validate(again, options)), parsed) << path;
+            EXPECT_EQ(report_text(json::validate(again, options)), parsed) << path;
         }
     }
 }
@@ -202,17 +135,17 @@ TEST(Events, MaxSizeRefusesLongerTexts) {
             const std::string expected = refused ? "19@0 1:1 10 the text is longer than the " +
                                                        std::to_string(max_size) +
                                                        " bytes ParseOptions::max_size allows"
-                                                 : report_of(ParseReport());
+                                                 : report_text(ParseReport());
             const std::string unread = refused ? text.substr(max_size + 1) : "";
             const std::string label =
                 std::to_string(text.size()) + " bytes, at most " + std::to_string(max_size);
 
             json::Value document = "kept";
-            EXPECT_EQ(report_of(json::parse(text, document, options)), expected) << label;
+            EXPECT_EQ(report_text(json::parse(text, document, options)), expected) << label;
             EXPECT_EQ(document == "kept", refused) << label;
-            EXPECT_EQ(report_of(json::validate(text, options)), expected) << label;
+            EXPECT_EQ(report_text(json::validate(text, options)), expected) << label;
             Recorder recorder;
-            EXPECT_EQ(report_of(json::parse_events(text, recorder, options)), expected) << label;
+            EXPECT_EQ(report_text(json::parse_events(text, recorder, options)), expected) << label;
             EXPECT_EQ(recorder.count == 0, refused) << label;
 
             const std::function<ParseReport(std::istream&)> stream_readers[] = {
@@ -222,55 +155,15 @@ TEST(Events, MaxSizeRefusesLongerTexts) {
             };
             for (const auto& read : stream_readers) {
                 std::istringstream in(text);
-                EXPECT_EQ(report_of(read(in)), expected) << label;
+                EXPECT_EQ(report_text(read(in)), expected) << label;
                 EXPECT_EQ(std::string(std::istreambuf_iterator<char>(in), {}), unread) << label;
             }
         }
     }
 }
 
-// Reformatting through the Writer keeps member order, repeated members and literals.
-TEST(Events, WriterKeepsWhatItIsGiven) {
-    std::string text;
-    json::Writer writer(text);
-    const std::string input = R"({"b": [1.50, 1e400], "a": 1234567890123456789, "b": "\/x"})";
-    ASSERT_TRUE(json::parse_events(input, writer));
-    EXPECT_EQ(text, R"({"b":[1.50,1e400],"a":1234567890123456789,"b":"\/x"})");
-}
-
 // A stream of 200 MB is checked, and read as events, in bounded memory: nothing but the open
 // containers, the longest token and one piece is held.
-constexpr std::string_view RECORD =
-    R"({"id": 1234567890123, "name": "a record of some length", "tags": [1, 2]},)";
-
-class Generated : public std::streambuf {
-  public:
-    explicit Generated(std::size_t records) : records(records) {}
-
-  private:
-    int_type underflow() override {
-        if (made > records) {
-            return traits_type::eof();
-        }
-        piece.clear();
-        if (made == 0) {
-            piece = "[";
-        }
-        for (int i = 0; i < 1000 && made < records; ++i, ++made) {
-            piece += RECORD;
-        }
-        if (made == records) {
-            piece += "null]";
-            ++made;
-        }
-        setg(piece.data(), piece.data(), piece.data() + piece.size());
-        return traits_type::to_int_type(piece[0]);
-    }
-    std::size_t records;
-    std::size_t made = 0;
-    std::string piece;
-};
-
 long peak_kilobytes() {
     rusage usage{};
     getrusage(RUSAGE_SELF, &usage);
@@ -278,12 +171,13 @@ long peak_kilobytes() {
 }
 
 TEST(Events, TwoHundredMegabytesInBoundedMemory) {
-    const std::size_t records = 200'000'000 / RECORD.size();
+    using test_support::GeneratedRecords;
+    constexpr std::size_t records = 3'000'000;
     const long before = peak_kilobytes();
-    Generated validated(records);
+    GeneratedRecords validated(records, json::RecordReader::Layout::ARRAY);
     std::istream stream(&validated);
     EXPECT_TRUE(json::validate(stream));
-    Generated counted(records);
+    GeneratedRecords counted(records, json::RecordReader::Layout::ARRAY);
     std::istream again(&counted);
     struct Counter : json::NoOpHandler {
         std::size_t numbers = 0;
