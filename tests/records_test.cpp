@@ -2,18 +2,17 @@
 // stream, skipping bad lines, pieces of every size, the options per record, agreement with
 // json::parse, failing streams and allocations, and memory that does not grow with the stream.
 #include "support/allocation_failure.hpp"
+#include "support/documents.hpp"
+#include "support/reading.hpp"
 
 #include <json/json.hpp>
 
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <filesystem>
 #include <fstream>
-#include <iterator>
 #include <memory>
 #include <sstream>
-#include <streambuf>
 #include <string>
 #include <string_view>
 
@@ -22,39 +21,12 @@ namespace {
 using json::ParseOptions;
 using json::ParseReport;
 using Layout = json::RecordReader::Layout;
+using test_support::DiskGone;
+using test_support::InPieces;
+using test_support::options_from;
+using test_support::WHOLE;
 
-constexpr std::size_t WHOLE = std::string::npos;
 constexpr std::string_view BOM = "\xEF\xBB\xBF";
-
-struct DiskGone {};
-
-// A stream buffer that hands its text over `size` bytes at a time and never says that more is
-// there, so that the reader takes pieces of that size (with one byte, every token straddles
-// pieces); a broken one then throws DiskGone instead of ending.
-class InPieces : public std::streambuf {
-  public:
-    InPieces(std::string text, std::size_t size, bool broken = false)
-        : text(std::move(text)), size(size), broken(broken) {}
-
-  private:
-    int_type underflow() override {
-        const std::size_t count = std::min(size, text.size() - next);
-        if (count == 0 && broken) {
-            throw DiskGone();
-        }
-        if (count == 0) {
-            return traits_type::eof();
-        }
-        char* const first = text.data() + next;
-        setg(first, first, first + count);
-        next += count;
-        return traits_type::to_int_type(*first);
-    }
-    std::string text;
-    std::size_t size;
-    bool broken;
-    std::size_t next = 0;
-};
 
 std::string place_of(const ParseReport& report) {
     return "!" + std::to_string(static_cast<int>(report.result)) + "@" +
@@ -85,12 +57,6 @@ std::string records_of(const std::string& text, Layout layout, const ParseOption
     InPieces buffer(text, piece);
     std::istream in(&buffer);
     return records_of(in, layout, options);
-}
-
-ParseOptions with(void (*set)(ParseOptions&)) {
-    ParseOptions options;
-    set(options);
-    return options;
 }
 
 struct Row {
@@ -159,7 +125,7 @@ TEST(Records, Lines) {
         // A byte order mark only at the start of the stream, and only with allow_bom.
         {Layout::LINES, std::string(BOM) + "1\n2", "!11@1:1 2 "},
         {Layout::LINES, std::string(BOM) + "1\nx\n" + std::string(BOM) + "2\n3",
-         "1 !11@2:1 !11@3:1 3 ", with([](ParseOptions& o) { o.allow_bom = true; })},
+         "1 !11@2:1 !11@3:1 3 ", options_from("b")},
     };
     for (const Row& row : rows) {
         check(row);
@@ -169,15 +135,9 @@ TEST(Records, Lines) {
 // The options act on each record as json::parse applies them: a refusal ends the records of an
 // array and skips a line; what one record holds does not count against the next.
 TEST(Records, OptionsPerRecord) {
-    const ParseOptions exact = with([](ParseOptions& o) { o.exact_numbers = true; });
-    const ParseOptions unique = with([](ParseOptions& o) { o.reject_duplicate_keys = true; });
-    const ParseOptions shallow = with([](ParseOptions& o) { o.max_depth = 3; });
-    const ParseOptions deep_enough = with([](ParseOptions& o) { o.max_depth = 100'001; });
+    const ParseOptions exact = options_from("x"), unique = options_from("d");
+    const ParseOptions shallow = options_from("", 3), deep_enough = options_from("", 100'001);
     const std::string deep = std::string(100'000, '[') + std::string(100'000, ']');
-    const ParseOptions lenient = with([](ParseOptions& o) {
-        o.allow_comments = true;
-        o.allow_trailing_commas = true;
-    });
     const Row rows[] = {
         {Layout::LINES, "1.5\n9007199254740993\n2", "1.5 !13@2:1 2 ", exact},
         {Layout::ARRAY, "[1.5, 1e400, 2]", "1.5 !13@1:7 ", exact},
@@ -190,8 +150,8 @@ TEST(Records, OptionsPerRecord) {
         {Layout::LINES, "[[[1]]]\n[[[[2]]]]\n3", "[[[1]]] !15@2:4 3 ", shallow},
         {Layout::LINES, deep + "\n" + deep, deep + " " + deep + " ", deep_enough},
         {Layout::ARRAY, "[" + deep + "]", deep + " ", deep_enough},
-        {Layout::LINES, "1 // one\n/* two: */ 2 /* three */ 3", "1 2 3 ", lenient},
-        {Layout::ARRAY, "[1, /* two */ 2, ]", "1 2 ", lenient},
+        {Layout::LINES, "1 // one\n/* two: */ 2 /* three */ 3", "1 2 3 ", options_from("ct")},
+        {Layout::ARRAY, "[1, /* two */ 2, ]", "1 2 ", options_from("ct")},
     };
     for (const Row& row : rows) {
         check(row);
@@ -221,11 +181,6 @@ TEST(Records, LongStreams) {
     check({Layout::LINES, lines, expected}, {WHOLE, std::size_t{4096}, std::size_t{65537}});
 }
 
-std::string report_of(const ParseReport& report) {
-    return place_of(report) + std::to_string(report.offset) + " " +
-           std::to_string(static_cast<int>(report.refusal)) + " " + report.note;
-}
-
 // With Layout::ARRAY the reader fails where json::parse fails on a text that starts with an
 // array, with the same report, and reads exactly the elements of what it parses: over the
 // conformance suite, whole and a byte at a time. Any text json::parse takes is one record of
@@ -233,9 +188,8 @@ std::string report_of(const ParseReport& report) {
 TEST(Records, AgreeWithParse) {
     std::string all_lines;
     std::string all_documents;
-    for (const auto& entry : std::filesystem::directory_iterator(JSON_TEST_PARSING_DIR)) {
-        std::ifstream file(entry.path(), std::ios::binary);
-        const std::string text{std::istreambuf_iterator<char>(file), {}};
+    for (const auto& path : test_support::suite_files()) {
+        const std::string text = test_support::read_file(path);
         json::Value document;
         const ParseReport parsed = json::parse(text, document, {});
         if (parsed && text.find_first_of("\r\n") == std::string::npos) {
@@ -261,8 +215,9 @@ TEST(Records, AgreeWithParse) {
             while (reader.next(record)) {
                 records += json::serialize(record) + " ";
             }
-            EXPECT_EQ(report_of(reader.report()), report_of(parsed)) << entry.path();
-            EXPECT_TRUE(!parsed || records == elements) << entry.path();
+            EXPECT_EQ(test_support::report_text(reader.report()), test_support::report_text(parsed))
+                << path;
+            EXPECT_TRUE(!parsed || records == elements) << path;
         }
     }
     EXPECT_EQ(records_of(all_lines, Layout::LINES), all_documents);
@@ -272,7 +227,7 @@ TEST(Records, AgreeWithParse) {
 TEST(Records, FailingStreams) {
     for (const Layout layout : {Layout::ARRAY, Layout::LINES}) {
         const std::string text = layout == Layout::ARRAY ? "[1,\n 22,\n 3" : "1\n 22\n 3";
-        InPieces buffer(text, WHOLE, true);
+        InPieces buffer(text, WHOLE, text.size());
         std::istream broken(&buffer);
         EXPECT_EQ(records_of(broken, layout, {}), "1 22 !19@3:3 ");
         EXPECT_TRUE(broken.bad());
@@ -282,7 +237,7 @@ TEST(Records, FailingStreams) {
 
         // With exceptions enabled for badbit, the buffer's own exception reaches the caller;
         // the reader is then at its end and the record as it was.
-        InPieces throwing(text, WHOLE, true);
+        InPieces throwing(text, WHOLE, text.size());
         std::istream strict(&throwing);
         strict.exceptions(std::ios::badbit);
         json::RecordReader reader(strict, {}, layout);
@@ -330,41 +285,12 @@ TEST(Records, AllocationFailures) {
     }
 }
 
-// A generated stream of records, made as it is read, so that no large text is ever held.
-class Generated : public std::streambuf {
-  public:
-    Generated(std::size_t records, Layout layout) : records(records), layout(layout) {}
-
-  private:
-    int_type underflow() override {
-        piece.clear();
-        if (made == 0 && layout == Layout::ARRAY) {
-            piece = "[";
-        }
-        for (int i = 0; i < 1000 && made < records; ++i, ++made) {
-            piece += R"({"id": )" + std::to_string(made) +
-                     R"(, "name": "a record of some length", "tags": [1, 2]})";
-            const bool last = made + 1 == records;
-            piece += layout == Layout::LINES ? "\n" : last ? "]" : ",\n";
-        }
-        if (piece.empty()) {
-            return traits_type::eof();
-        }
-        setg(piece.data(), piece.data(), piece.data() + piece.size());
-        return traits_type::to_int_type(piece[0]);
-    }
-    std::size_t records;
-    Layout layout;
-    std::size_t made = 0;
-    std::string piece;
-};
-
 // What the reader holds does not grow with the stream: over the last nine tenths of the records
 // no more, give or take a piece, than over the first tenth; and every record is handed over.
 TEST(Records, MemoryDoesNotGrowWithTheStream) {
     constexpr std::size_t records = 100'000; // about 6.5 MB
     for (const Layout layout : {Layout::ARRAY, Layout::LINES}) {
-        Generated generated(records, layout);
+        test_support::GeneratedRecords generated(records, layout);
         std::istream in(&generated);
         json::RecordReader reader(in, {}, layout);
         json::Value record;
