@@ -1,8 +1,9 @@
 #ifndef JSON_TESTS_DOCUMENTS_HPP
 #define JSON_TESTS_DOCUMENTS_HPP
 
-// The documents the tests read: texts that must parse, parse options by letter, and the files
-// of the parsing test suite and the benchmarks (JSON_TEST_PARSING_DIR, JSON_BENCH_DATA_DIR).
+// The documents the tests read and write: parse and write options by letter, texts that must
+// parse, and the files of the parsing test suite and the benchmarks (JSON_TEST_PARSING_DIR,
+// JSON_BENCH_DATA_DIR).
 
 #include <json/json.hpp>
 
@@ -34,6 +35,24 @@ inline json::ParseOptions options_from(std::string_view letters,
     options.allow_bom = has('b');
     options.allow_inexact_integers = has('i');
     options.allow_overflow = has('o');
+    return options;
+}
+
+/// Write options from letters: p pretty, t indentation by tabs, 2 or 0 spaces per level, e empty
+/// containers unpadded, s a space after colons, / slashes unescaped, a ASCII only, n non-finite
+/// numbers refused, u invalid UTF-8 written as it is.
+inline json::WriteOptions write_options_from(std::string_view letters) {
+    const auto has = [letters](char letter) { return letters.find(letter) != letters.npos; };
+    json::WriteOptions options;
+    options.pretty = has('p');
+    options.indent_with_tab = has('t');
+    options.indent = has('2') ? 2 : has('0') ? 0 : options.indent;
+    options.pad_empty_containers = !has('e');
+    options.space_after_colon = has('s');
+    options.escape_slash = !has('/');
+    options.ascii_only = has('a');
+    options.reject_non_finite = has('n');
+    options.allow_invalid_utf8 = has('u');
     return options;
 }
 
