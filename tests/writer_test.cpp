@@ -1,87 +1,36 @@
-#include <json/json.hpp>
-
+// The json::Writer: serialize's text from events, numbers and literals, calls out of place and
+// refused arguments, failed and unfinished writes, and what reaches a stream when.
+#include "support/documents.hpp"
 #include "support/errors.hpp"
+
+#include <json/json.hpp>
 
 #include <gtest/gtest.h>
 
 #include <cmath>
-#include <fstream>
 #include <functional>
+#include <map>
 #include <sstream>
 #include <stdexcept>
 
 namespace {
 
 using namespace json;
+using test_support::write_options_from;
 
-// More text than a Writer onto a stream gathers before it hands it on.
-constexpr std::size_t detail_buffer_size() {
-    return std::size_t{64} * 1024;
-}
-
-// Hands a Writer the events of a walk over `value`: members in key order, members holding
-// Undefined left out, Undefined elements as null, doubles as number(double).
-void emit(const Value& value, Writer& writer) {
-    switch (value.which()) {
-    case detail::NULL_INDEX:
-    case detail::UNDEFINED_INDEX:
-        writer.null();
-        break;
-    case detail::BOOL_INDEX:
-        writer.boolean(boost::get<bool>(value));
-        break;
-    case detail::DOUBLE_INDEX:
-        writer.number(boost::get<double>(value));
-        break;
-    case detail::STRING_INDEX:
-        writer.string(boost::get<std::string>(value));
-        break;
-    case detail::ARRAY_INDEX:
-        writer.begin_array();
-        for (const Value& item : boost::get<Array>(value)) {
-            emit(item, writer);
-        }
-        writer.end_array();
-        break;
-    case detail::OBJECT_INDEX:
-        writer.begin_object();
-        for (const auto& [key, member] : boost::get<Object>(value)) {
-            if (member.which() != detail::UNDEFINED_INDEX) {
-                writer.key(key);
-                emit(member, writer);
-            }
-        }
-        writer.end_object();
-        break;
-    default:
-        writer.value(value); // a float: its own shortest text
-    }
-}
-
-std::vector<WriteOptions> option_sets() {
-    WriteOptions pretty;
-    pretty.pretty = true;
-    WriteOptions tabs_ascii = pretty;
-    tabs_ascii.indent_with_tab = true;
-    tabs_ascii.ascii_only = true;
-    WriteOptions flat = pretty;
-    flat.indent = 0;
-    flat.pad_empty_containers = false;
-    flat.escape_slash = false;
-    return {WriteOptions(), pretty, COMMON_PRETTY, tabs_ascii, flat};
-}
-
-// The Writer gives serialize's text from events that do not come from serialize's own walk:
-// onto a string, those of a walk over the Value (emit); onto a stream, those the parser reads
-// from the document's compact text.
+// The Writer gives serialize's text under several layouts, from the events the parser reads from
+// the document's compact text (not from serialize's own walk): onto a string after what it held,
+// complete without flush(), and onto a stream.
 void expect_text_of_serialize(const Value& document) {
     const std::string compact = serialize(document);
-    for (const WriteOptions& options : option_sets()) {
+    for (const WriteOptions& options :
+         {write_options_from(""), write_options_from("p"), COMMON_PRETTY, write_options_from("pta"),
+          write_options_from("p0e/")}) {
         const std::string expected = serialize(document, options);
-        std::string by_events = "before:";
-        Writer writer(by_events, options);
-        emit(document, writer);
-        EXPECT_EQ(by_events, "before:" + expected) << "complete without flush()";
+        std::string text = "before:";
+        Writer onto_string(text, options);
+        ASSERT_TRUE(parse_events(compact, onto_string));
+        EXPECT_EQ(text, "before:" + expected);
         std::ostringstream stream;
         Writer onto_stream(stream, options);
         ASSERT_TRUE(parse_events(compact, onto_stream));
@@ -101,24 +50,19 @@ TEST(Writer, EventsGiveTheTextOfSerialize) {
     expect_text_of_serialize(Array{});
     // Text that outgrows the Writer's buffer, with a string longer than that buffer.
     expect_text_of_serialize(Array{std::string(40000, 'x'), Array(3000, 0.25)});
+    for (const auto& path : test_support::bench_files()) {
+        expect_text_of_serialize(
+            test_support::parsed(test_support::read_file(path), test_support::options_from("i")));
+    }
 }
 
-TEST(Writer, EventsGiveTheTextOfSerializeOnTheBenchDocuments) {
-    for (const char* name : {"twitter", "citm_catalog", "canada"}) {
-        std::ifstream file(std::string(JSON_BENCH_DATA_DIR) + "/" + name + ".json");
-        std::ostringstream text;
-        text << file.rdbuf();
-        Value document;
-        // twitter.json's 64-bit ids are rounded on purpose: the text is the rounded document's.
-        ParseOptions rounding;
-        rounding.allow_inexact_integers = true;
-        ASSERT_TRUE(parse(text.str(), document, rounding)) << name;
-        expect_text_of_serialize(document);
-        WriteOptions pretty;
-        pretty.pretty = true;
-        EXPECT_EQ(serialize(document, {}), serialize(document));
-        EXPECT_EQ(serialize(document, pretty), pretty_print(document));
-    }
+// Reformatting through the Writer keeps member order, repeated members and literals.
+TEST(Writer, KeepsWhatTheEventsGive) {
+    std::string text;
+    Writer writer(text);
+    ASSERT_TRUE(
+        parse_events(R"({"b": [1.50, 1e400], "a": 1234567890123456789, "b": "\/x"})", writer));
+    EXPECT_EQ(text, R"({"b":[1.50,1e400],"a":1234567890123456789,"b":"\/x"})");
 }
 
 // Indentation too long for the stream's buffer to take in one piece goes out in pieces.
@@ -140,13 +84,16 @@ TEST(Writer, ScalarsAndNumberTexts) {
     for (const char* literal : {"0", "-0", "-0.5e+3", "12E-07", "1.25", "9007199254740993"}) {
         writer.number(literal);
     }
-    writer.number(NAN);
-    writer.number(100000.0);
+    for (const double number : {std::nan(""), 100000.0, -0.0, 1e300, 0.1}) {
+        writer.number(number);
+    }
+    writer.value(2.5f);
     writer.value(Undefined());
     EXPECT_FALSE(writer.complete());
     writer.end_array();
     EXPECT_TRUE(writer.complete());
-    EXPECT_EQ(text, R"([0,-0,-0.5e+3,12E-07,1.25,9007199254740993,"NaN",1e+05,null])");
+    EXPECT_EQ(text,
+              R"([0,-0,-0.5e+3,12E-07,1.25,9007199254740993,"NaN",1e+05,-0,1e+300,0.1,2.5,null])");
 
     // Undefined alone at the top level writes nothing, and the value is still to come.
     std::string top;
@@ -157,94 +104,74 @@ TEST(Writer, ScalarsAndNumberTexts) {
     EXPECT_EQ(top, "false");
 }
 
-// Each call out of place throws and writes nothing; the Writer goes on as if it had not come.
+using Events = std::function<void(Writer&)>;
+
+// Plays events by letter: [ ] { } as themselves, k the key "a", n null, t true, s the string
+// "v", 1 the number 1.0, v the Value 1, u an Undefined Value.
+void play(Writer& writer, std::string_view events) {
+    static const std::map<char, Events> by_letter = {
+        {'[', [](Writer& w) { w.begin_array(); }},     {']', [](Writer& w) { w.end_array(); }},
+        {'{', [](Writer& w) { w.begin_object(); }},    {'}', [](Writer& w) { w.end_object(); }},
+        {'k', [](Writer& w) { w.key("a"); }},          {'n', [](Writer& w) { w.null(); }},
+        {'t', [](Writer& w) { w.boolean(true); }},     {'s', [](Writer& w) { w.string("v"); }},
+        {'1', [](Writer& w) { w.number(1.0); }},       {'v', [](Writer& w) { w.value(1); }},
+        {'u', [](Writer& w) { w.value(Undefined()); }}};
+    for (const char event : events) {
+        by_letter.at(event)(writer);
+    }
+}
+
+// After the events `before`, with the options of `letters`, `misuse` throws Error and the
+// Writer writes nothing.
+template <typename Error>
+void expect_refused(std::string_view before, std::string_view letters, const Events& misuse) {
+    std::string text;
+    Writer writer(text, write_options_from(letters));
+    play(writer, before);
+    writer.flush();
+    const std::string written = text;
+    EXPECT_THROW(misuse(writer), Error) << before << " then a misuse";
+    writer.flush();
+    EXPECT_EQ(text, written);
+}
+
+// Each call out of place throws std::logic_error, each argument that has no JSON text or that
+// the options refuse std::invalid_argument; either writes nothing, and the Writer goes on as if
+// the call had not come.
 TEST(Writer, MisuseWritesNothing) {
-    using Call = std::function<void(Writer&)>;
-    const Call open_object = [](Writer& w) { w.begin_object(); };
-    const Call open_array = [](Writer& w) { w.begin_array(); };
-    const Call named = [](Writer& w) {
-        w.begin_object();
-        w.key("a");
-    };
-    const Call done = [](Writer& w) {
-        w.begin_array();
-        w.end_array();
-    };
-    const Call nothing = [](Writer&) {};
-    WriteOptions ascii;
-    ascii.ascii_only = true;
-    WriteOptions numbers_only;
-    numbers_only.reject_non_finite = true;
-    const struct {
-        Call before, misuse;
-        bool logic; // std::logic_error, else std::invalid_argument
-        WriteOptions options = {};
-    } rows[] = {
-        {nothing, [](Writer& w) { w.key("a"); }, true},
-        {open_array, [](Writer& w) { w.key("a"); }, true},
-        {named, [](Writer& w) { w.key("b"); }, true},
-        {open_object, [](Writer& w) { w.null(); }, true},
-        {open_object, [](Writer& w) { w.string("v"); }, true},
-        {open_object, [](Writer& w) { w.number(1.0); }, true},
-        {open_object, [](Writer& w) { w.begin_array(); }, true},
-        {open_object, [](Writer& w) { w.value(1); }, true},
-        {open_object, [](Writer& w) { w.end_array(); }, true},
-        {open_array, [](Writer& w) { w.end_object(); }, true},
-        {named, [](Writer& w) { w.end_object(); }, true},
-        {nothing, [](Writer& w) { w.end_array(); }, true},
-        {done, [](Writer& w) { w.boolean(true); }, true},
-        {done, [](Writer& w) { w.begin_object(); }, true},
-        {done, [](Writer& w) { w.value(Undefined()); }, true},
-        {named, [](Writer& w) { w.value(Undefined()); }, false},
-        {open_array, [](Writer& w) { w.string("\xC3"); }, false, ascii},
-        {open_object, [](Writer& w) { w.key("a\x80"); }, false, ascii},
-        {open_array, [](Writer& w) { w.string("ok \xED\xA0\x80"); }, false},
-        {open_object, [](Writer& w) { w.key("\xF4\x90\x80\x80"); }, false},
-        {nothing,
-         [](Writer& w) {
-             w.value(Object{{"a", Array{1, "x\xC3"}}});
-         },
-         false},
-        {nothing,
-         [](Writer& w) {
-             w.value(Object{{"a\xFF", 1}});
-         },
-         false},
-        {open_array,
-         [](Writer& w) {
-             w.value(Array{"x", Array{"\xC0\x80"}});
-         },
-         false},
-        {open_array, [](Writer& w) { w.number(std::nan("")); }, false, numbers_only},
-        {open_array,
-         [](Writer& w) {
-             w.value(Array{1, -HUGE_VAL});
-         },
-         false, numbers_only},
-        {open_array, [](Writer& w) { w.value(HUGE_VALF); }, false, numbers_only},
-        {nothing, [](Writer& w) { w.number(""); }, false},
-        {open_array, [](Writer& w) { w.number("01"); }, false},
-        {open_array, [](Writer& w) { w.number("1."); }, false},
-        {open_array, [](Writer& w) { w.number("+1"); }, false},
-        {open_array, [](Writer& w) { w.number("NaN"); }, false},
-        {open_array, [](Writer& w) { w.number(".5"); }, false},
-        {open_array, [](Writer& w) { w.number("1e"); }, false},
-        {open_array, [](Writer& w) { w.number("-"); }, false},
-        {open_array, [](Writer& w) { w.number("1 "); }, false},
-    };
-    for (const auto& row : rows) {
-        std::string text;
-        Writer writer(text, row.options);
-        row.before(writer);
-        writer.flush();
-        const std::string before = text;
-        if (row.logic) {
-            EXPECT_THROW(row.misuse(writer), std::logic_error) << before;
-        } else {
-            EXPECT_THROW(row.misuse(writer), std::invalid_argument) << before;
-        }
-        writer.flush();
-        EXPECT_EQ(text, before);
+    const std::pair<const char*, const char*> out_of_place[] = {
+        {"", "k"},   {"[", "k"}, {"{k", "k"}, {"{", "n"},  {"{", "s"},
+        {"{", "1"},  {"{", "["}, {"{", "v"},  {"{", "]"},  {"[", "}"},
+        {"{k", "}"}, {"", "]"},  {"[]", "t"}, {"[]", "{"}, {"[]", "u"}};
+    for (const auto& [before, event] : out_of_place) {
+        expect_refused<std::logic_error>(before, "",
+                                         [event = event](Writer& w) { play(w, event); });
+    }
+    // Not well-formed UTF-8 (checked whole before a byte is written), non-finite numbers with
+    // reject_non_finite, Undefined as a member's value.
+    const std::tuple<const char*, const char*, Value> values[] = {
+        {"{k", "", Undefined()},         {"", "", Object{{"a", Array{1, "x\xC3"}}}},
+        {"", "", Object{{"a\xFF", 1}}},  {"[", "", Array{"x", Array{"\xC0\x80"}}},
+        {"[", "n", Array{1, -HUGE_VAL}}, {"[", "n", HUGE_VALF}};
+    for (const auto& [before, letters, value] : values) {
+        expect_refused<std::invalid_argument>(before, letters,
+                                              [&value = value](Writer& w) { w.value(value); });
+    }
+    // A string after "[", a member name after "{".
+    const std::tuple<const char*, const char*, const char*> strings[] = {
+        {"[", "a", "\xC3"},
+        {"{", "a", "a\x80"},
+        {"[", "", "ok \xED\xA0\x80"},
+        {"{", "", "\xF4\x90\x80\x80"}};
+    for (const auto& [before, letters, utf8] : strings) {
+        const bool name = before[0] == '{';
+        expect_refused<std::invalid_argument>(before, letters, [name, utf8 = utf8](Writer& w) {
+            name ? w.key(utf8) : w.string(utf8);
+        });
+    }
+    expect_refused<std::invalid_argument>("[", "n", [](Writer& w) { w.number(std::nan("")); });
+    for (const char* literal : {"", "01", "1.", "+1", "NaN", ".5", "1e", "-", "1 "}) {
+        expect_refused<std::invalid_argument>("[", "", [literal](Writer& w) { w.number(literal); });
     }
 
     // After a refused call the Writer carries on.
@@ -269,10 +196,7 @@ TEST(Writer, RefusalsAndWhatTheOptionsLetThrough) {
               }),
               "invalid: json: byte 1 of the string at \"/a/1\" is not well-formed UTF-8 "
               "(WriteOptions::allow_invalid_utf8 writes it as it is)");
-    WriteOptions lenient;
-    lenient.allow_invalid_utf8 = true;
-    lenient.reject_non_finite = true;
-    Writer writer(text, lenient);
+    Writer writer(text, write_options_from("un"));
     writer.begin_object();
     writer.key("\xFF");
     EXPECT_EQ(test_support::error_of([&] {
@@ -302,7 +226,8 @@ TEST(Writer, FailedWriteLeavesItUnusable) {
     out.exceptions(std::ios::badbit);
     Writer writer(out);
     writer.begin_array();
-    EXPECT_THROW(writer.string(std::string(detail_buffer_size(), 'x')), std::runtime_error);
+    // More than the Writer gathers before it hands text on to its stream.
+    EXPECT_THROW(writer.string(std::string(std::size_t{64} * 1024, 'x')), std::runtime_error);
     EXPECT_THROW(writer.end_array(), std::logic_error);
     EXPECT_THROW(writer.null(), std::logic_error);
 }
@@ -311,12 +236,7 @@ TEST(Writer, FailedWriteLeavesItUnusable) {
 // back to what it held before, however much was written into it; a stream gets nothing more
 // and failbit, without an exception from the destructor.
 TEST(Writer, AnIncompleteDocumentIsNotHandedOn) {
-    using Events = std::function<void(Writer&)>;
-    const Events truncated = [](Writer& w) {
-        w.begin_array();
-        w.begin_object();
-        w.key("k");
-    };
+    const Events truncated = [](Writer& w) { play(w, "[{k"); };
     const Events long_and_truncated = [](Writer& w) {
         w.begin_array();
         for (int i = 0; i < 1000; ++i) {
@@ -324,8 +244,7 @@ TEST(Writer, AnIncompleteDocumentIsNotHandedOn) {
         }
     };
     const Events flushed_and_truncated = [](Writer& w) {
-        w.begin_array();
-        w.null();
+        play(w, "[n");
         w.flush();
     };
     for (const Events& events : {truncated, long_and_truncated, flushed_and_truncated}) {
@@ -367,10 +286,8 @@ class CountingBuffer : public std::stringbuf {
 TEST(Writer, OntoAStream) {
     CountingBuffer buffer;
     std::ostream out(&buffer);
-    WriteOptions pretty;
-    pretty.pretty = true;
     {
-        Writer writer(out, pretty);
+        Writer writer(out, write_options_from("p"));
         writer.begin_array();
         writer.string("a");
         writer.null();
