@@ -5,11 +5,13 @@
 
 #include <json/text_conversion.hpp>
 
+#include <charconv>
 #include <cmath>
 #include <cstdint>
 #include <limits>
 #include <stdexcept>
 #include <string>
+#include <system_error>
 
 namespace json::detail {
 
@@ -28,14 +30,17 @@ std::optional<double> scaled_exactly(std::uint64_t digits, long long exponent) n
     return exponent < 0 ? number / power : number * power;
 }
 
-// A literal without an exponent whose digits, the point left out, number at most fifteen is
-// converted here, by scaled_exactly: those digits are below 2^53 and the power of ten at most
-// 10^15. Most numbers in documents (counts, ids, coordinates, prices) take this path; the
-// others go to the number-text library.
+// A literal without an exponent is converted here when its digits fit in 64 bits and one
+// rounding gives the double nearest to it: an integer of up to nineteen digits (below 10^19, so
+// below 2^64) by the conversion of its 64-bit value, which rounds once, to nearest; a number
+// with a fraction and at most fifteen digits, the point left out, by scaled_exactly (digits
+// below 2^53, a power of ten of at most 10^15). Most numbers in documents (counts, ids,
+// coordinates, prices) take this path; the others go to the number-text library.
 double read_number(std::string_view literal) noexcept {
-    constexpr std::ptrdiff_t most_digits = 15;
-    // A sign, fifteen digits and a point at most: longer literals are not read twice.
-    if (literal.size() > most_digits + 2) {
+    constexpr std::ptrdiff_t most_integer_digits = 19;
+    constexpr std::ptrdiff_t most_fraction_digits = 15;
+    // A sign and nineteen digits at most: longer literals are not read twice.
+    if (literal.size() > most_integer_digits + 1) {
         return string_to_double(literal.data());
     }
     const auto is_digit = [](char c) { return c >= '0' && c <= '9'; };
@@ -52,28 +57,51 @@ double read_number(std::string_view literal) noexcept {
         return next - first;
     };
     std::ptrdiff_t count = read_digits();
+    if (next == end && count <= most_integer_digits) {
+        const auto magnitude = static_cast<double>(digits);
+        return negative ? -magnitude : magnitude;
+    }
     std::ptrdiff_t decimals = 0;
     if (next != end && *next == '.') {
         ++next;
         decimals = read_digits();
         count += decimals;
     }
-    if (next != end || count > most_digits) {
+    if (next != end || count > most_fraction_digits) {
         return string_to_double(literal.data()); // an exponent, or too many digits
     }
     const double magnitude = *scaled_exactly(digits, -decimals);
     return negative ? -magnitude : magnitude;
 }
 
+namespace {
+
+// Where the integer part of a literal ends: at its point, its exponent or its end. A loop of
+// its own: a search for any of three bytes calls memchr for every byte of the literal.
+std::size_t integer_part_end(std::string_view literal) noexcept {
+    std::size_t at = 0;
+    while (at != literal.size() && literal[at] != '.' && literal[at] != 'e' && literal[at] != 'E') {
+        ++at;
+    }
+    return at;
+}
+
+} // namespace
+
 bool may_change(std::string_view literal) noexcept {
     constexpr std::size_t exact_digits = 15; // every integer of up to fifteen digits is exact
-    const std::size_t point_or_exponent = literal.find_first_of(".eE");
-    if (point_or_exponent == std::string_view::npos) {
-        return literal.size() > exact_digits; // an integer of sixteen or more characters
-    }
     const std::size_t sign = literal.front() == '-' ? 1 : 0;
-    return point_or_exponent - sign > exact_digits || // beyond the range without an exponent
-           literal.find_first_of("eE", point_or_exponent) != std::string_view::npos;
+    const std::size_t point_or_exponent = integer_part_end(literal);
+    if (point_or_exponent - sign > exact_digits) {
+        return true; // an integer part beyond the exact integers
+    }
+    // Past the integer part come the fraction and then the exponent.
+    for (std::size_t at = point_or_exponent; at != literal.size(); ++at) {
+        if (literal[at] == 'e' || literal[at] == 'E') {
+            return true;
+        }
+    }
+    return false;
 }
 
 namespace {
@@ -118,14 +146,22 @@ NumberChange change_of(std::string_view literal, double value) {
         return NumberChange::OVERFLOW;
     }
     constexpr double exact_integers = 9007199254740992.0; // 2^53: every integer below is exact
-    if (std::fabs(value) < exact_integers ||
-        literal.find_first_of(".eE") != std::string_view::npos) {
+    const double magnitude = std::fabs(value);
+    if (magnitude < exact_integers || integer_part_end(literal) != literal.size()) {
         return NumberChange::NONE; // a fraction or an exponent is rounded as asked
     }
-    // JSON integers have no leading zeros: equal values have equal digits.
+    // JSON integers have no leading zeros: equal values have equal digits. An integer below
+    // 2^64 is compared as one, a longer one with the double's exact decimal digits.
     const std::string_view digits = literal.substr(literal.front() == '-' ? 1 : 0);
-    return digits == exact_integer_text(std::fabs(value)) ? NumberChange::NONE
-                                                          : NumberChange::INEXACT_INTEGER;
+    constexpr double past_64_bits = 18446744073709551616.0; // 2^64
+    std::uint64_t integer = 0;
+    if (magnitude < past_64_bits &&
+        std::from_chars(digits.data(), digits.data() + digits.size(), integer).ec == std::errc()) {
+        return static_cast<std::uint64_t>(magnitude) == integer ? NumberChange::NONE
+                                                                : NumberChange::INEXACT_INTEGER;
+    }
+    return digits == exact_integer_text(magnitude) ? NumberChange::NONE
+                                                   : NumberChange::INEXACT_INTEGER;
 }
 
 namespace {
