@@ -30,14 +30,10 @@ class DocumentBuilder {
     /// The builder's stacks are kept in `workspace`, each with room for a small document from
     /// the start.
     DocumentBuilder(const ParseOptions& options, Workspace& workspace)
-        : options(options), pending(workspace), texts(workspace), finished_arrays(workspace),
-          finished_objects(workspace), open_containers(workspace) {
-        pending.reserve(INITIAL_VALUES);
-        texts.reserve(INITIAL_VALUES);
-        open_containers.reserve(INITIAL_CONTAINERS);
-        finished_arrays.reserve(INITIAL_CONTAINERS);
-        finished_objects.reserve(INITIAL_CONTAINERS);
-    }
+        : options(options), pending(workspace, INITIAL_VALUES), texts(workspace, INITIAL_VALUES),
+          finished_arrays(workspace, INITIAL_CONTAINERS),
+          finished_objects(workspace, INITIAL_CONTAINERS),
+          open_containers(workspace, INITIAL_CONTAINERS) {}
 
     // The handler's events; false when the document is refused (see refusal()).
     bool null() {
@@ -176,8 +172,9 @@ class DocumentBuilder {
     // A container's own Pending is pushed when it opens, while its name is the last one read.
     bool open(Kind kind) {
         push(kind);
-        open_containers.push_back({kind == Kind::OBJECT, pending.size(), texts.size(),
-                                   finished_arrays.size(), finished_objects.size()});
+        open_containers.emplace_back(OpenContainer{kind == Kind::OBJECT, pending.size(),
+                                                   texts.size(), finished_arrays.size(),
+                                                   finished_objects.size()});
         return true;
     }
     bool close();
@@ -185,18 +182,18 @@ class DocumentBuilder {
     void close_array(const OpenContainer& container);
     void release_children(const OpenContainer& container);
     template <typename Place>
-    void adopt(const Pending& child, Place place);
+    [[gnu::always_inline]] void adopt(const Pending& child, Place place);
 
     const ParseOptions options;
     DocumentRefusal refusal;
     MemberNames repeated;
 
-    WorkspaceVector<Pending> pending; // the values of the open containers, in document order
+    WorkspaceStack<Pending> pending; // the values of the open containers, in document order
     // The member names and strings of the open containers, in document order.
-    WorkspaceVector<std::string> texts;
-    WorkspaceVector<Array> finished_arrays;
-    WorkspaceVector<Object> finished_objects;
-    WorkspaceVector<OpenContainer> open_containers;
+    WorkspaceStack<std::string> texts;
+    WorkspaceStack<Array> finished_arrays;
+    WorkspaceStack<Object> finished_objects;
+    WorkspaceStack<OpenContainer> open_containers;
     std::size_t member_name = 0;     // the index in `texts` of the last member name read
     std::uint64_t member_prefix = 0; // and its name_prefix()
     // The first capacities, which fill about two thirds of a Workspace (see there).
@@ -210,7 +207,7 @@ class DocumentBuilder {
 // alternative, inline: no call to the general copy constructor, which has containers to deal
 // with.
 template <typename Place>
-void DocumentBuilder::adopt(const Pending& child, Place place) {
+inline void DocumentBuilder::adopt(const Pending& child, Place place) {
     switch (child.kind) {
     case Kind::ARRAY:
         boost::get<Array>(place(Array())).swap(finished_arrays[child.slot]);
@@ -256,7 +253,7 @@ inline void DocumentBuilder::close_array(const OpenContainer& container) {
         });
     }
     release_children(container);
-    finished_arrays.push_back(std::move(items));
+    finished_arrays.emplace_back(std::move(items));
     pending.back().slot = finished_arrays.size() - 1;
 }
 
@@ -265,9 +262,9 @@ inline void DocumentBuilder::close_array(const OpenContainer& container) {
 // order is found with comparisons of eight-byte prefixes, most of which settle it without
 // comparing the names themselves.
 inline void DocumentBuilder::close_object(const OpenContainer& container) {
-    Pending* const first = pending.data() + container.first_value;
-    Pending* const last = pending.data() + pending.size();
-    const std::string* const names = texts.data();
+    Pending* const first = pending.begin() + container.first_value;
+    Pending* const last = pending.begin() + pending.size();
+    const std::string* const names = texts.begin();
     // Equal names keep document order, so that the last of them can be told apart.
     const auto key_order = [names](const Pending& left, const Pending& right) {
         if (left.name_prefix != right.name_prefix) {
@@ -298,16 +295,16 @@ inline void DocumentBuilder::close_object(const OpenContainer& container) {
         });
     }
     release_children(container);
-    finished_objects.push_back(std::move(members));
+    finished_objects.emplace_back(std::move(members));
     pending.back().slot = finished_objects.size() - 1;
 }
 
 // Drops what the children of a closed container left behind in the stacks.
 inline void DocumentBuilder::release_children(const OpenContainer& container) {
-    pending.resize(container.first_value);
-    texts.resize(container.first_text);
-    finished_arrays.resize(container.first_array);
-    finished_objects.resize(container.first_object);
+    pending.shrink_to(container.first_value);
+    texts.shrink_to(container.first_text);
+    finished_arrays.shrink_to(container.first_array);
+    finished_objects.shrink_to(container.first_object);
 }
 
 } // namespace json::detail
