@@ -87,6 +87,9 @@ inline bool read_kept_number(std::string_view literal, const ParseOptions& optio
     if (options.exact_numbers) {
         return read_number_exactly(literal, value) || refusal.inexact(literal);
     }
+    if (read_short_number(literal, value)) {
+        return true; // such numbers never change
+    }
     value = read_number(literal);
     if (!may_change(literal)) {
         return true;

@@ -7,7 +7,9 @@
 
 #include <charconv>
 #include <cmath>
+#include <cstddef>
 #include <cstdint>
+#include <iterator>
 #include <limits>
 #include <stdexcept>
 #include <string>
@@ -17,61 +19,35 @@ namespace json::detail {
 
 std::optional<double> scaled_exactly(std::uint64_t digits, long long exponent) noexcept {
     constexpr std::uint64_t exact_integers = std::uint64_t{1} << 53U;
-    constexpr long long largest_exact_power = 22;
-    static constexpr double powers_of_ten[largest_exact_power + 1] = {
-        1e0,  1e1,  1e2,  1e3,  1e4,  1e5,  1e6,  1e7,  1e8,  1e9,  1e10, 1e11,
-        1e12, 1e13, 1e14, 1e15, 1e16, 1e17, 1e18, 1e19, 1e20, 1e21, 1e22};
+    constexpr long long largest_exact_power = std::size(EXACT_POWERS_OF_TEN) - 1;
     if (digits > exact_integers || exponent < -largest_exact_power ||
         exponent > largest_exact_power) {
         return std::nullopt;
     }
     const auto number = static_cast<double>(digits);
-    const double power = powers_of_ten[exponent < 0 ? -exponent : exponent];
+    const double power = EXACT_POWERS_OF_TEN[exponent < 0 ? -exponent : exponent];
     return exponent < 0 ? number / power : number * power;
 }
 
-// A literal without an exponent is converted here when its digits fit in 64 bits and one
-// rounding gives the double nearest to it: an integer of up to nineteen digits (below 10^19, so
-// below 2^64) by the conversion of its 64-bit value, which rounds once, to nearest; a number
-// with a fraction and at most fifteen digits, the point left out, by scaled_exactly (digits
-// below 2^53, a power of ten of at most 10^15). Most numbers in documents (counts, ids,
-// coordinates, prices) take this path; the others go to the number-text library.
+// Besides the short numbers, an integer of up to nineteen digits (below 10^19, so below 2^64)
+// is converted here, from its 64-bit value: that conversion rounds once, to nearest, as the
+// number-text library does. The others go to the library.
 double read_number(std::string_view literal) noexcept {
-    constexpr std::ptrdiff_t most_integer_digits = 19;
-    constexpr std::ptrdiff_t most_fraction_digits = 15;
-    // A sign and nineteen digits at most: longer literals are not read twice.
-    if (literal.size() > most_integer_digits + 1) {
-        return string_to_double(literal.data());
+    double value = 0.0;
+    if (read_short_number(literal, value)) {
+        return value;
     }
-    const auto is_digit = [](char c) { return c >= '0' && c <= '9'; };
-    const char* next = literal.data();
-    const char* const end = next + literal.size();
-    const bool negative = *next == '-';
-    next += negative ? 1 : 0;
-    std::uint64_t digits = 0;
-    const auto read_digits = [&] {
-        const char* const first = next;
-        for (; next != end && is_digit(*next); ++next) {
-            digits = 10 * digits + static_cast<std::uint64_t>(*next - '0');
-        }
-        return next - first;
-    };
-    std::ptrdiff_t count = read_digits();
-    if (next == end && count <= most_integer_digits) {
-        const auto magnitude = static_cast<double>(digits);
+    constexpr std::size_t most_integer_digits = 19;
+    const bool negative = literal.front() == '-';
+    const std::string_view digits = literal.substr(negative ? 1 : 0);
+    std::uint64_t integer = 0;
+    if (digits.size() <= most_integer_digits &&
+        std::from_chars(digits.data(), digits.data() + digits.size(), integer).ptr ==
+            digits.data() + digits.size()) {
+        const auto magnitude = static_cast<double>(integer);
         return negative ? -magnitude : magnitude;
     }
-    std::ptrdiff_t decimals = 0;
-    if (next != end && *next == '.') {
-        ++next;
-        decimals = read_digits();
-        count += decimals;
-    }
-    if (next != end || count > most_fraction_digits) {
-        return string_to_double(literal.data()); // an exponent, or too many digits
-    }
-    const double magnitude = *scaled_exactly(digits, -decimals);
-    return negative ? -magnitude : magnitude;
+    return string_to_double(literal.data());
 }
 
 namespace {
