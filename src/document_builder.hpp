@@ -14,6 +14,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
+#include <new>
 #include <optional>
 #include <string>
 #include <string_view>
@@ -85,27 +86,32 @@ class DocumentBuilder {
     /// is left as it was (see json::parse).
     void take(Value& out) {
         const Pending& document = pending.back();
-        if (!is_container(out)) {
-            // The document is assigned to `out` directly, its old scalar or string set aside
-            // (moved: nothing to allocate) and put back if that assignment throws.
-            ValueVariant& target = out;
-            ValueVariant aside(std::move(target));
-            try {
-                adopt(document, [&target, &out](auto&& initial) -> Value& {
-                    target = std::forward<decltype(initial)>(initial);
-                    return out;
-                });
-            } catch (...) {
-                target = std::move(aside);
-                throw;
-            }
+        if (is_container(out)) {
+            std::optional<Value> made;
+            adopt(document, [&made](auto&& initial) -> Value& {
+                return made.emplace(std::forward<decltype(initial)>(initial));
+            });
+            out.swap(*made);
             return;
         }
-        std::optional<Value> made;
-        adopt(document, [&made](auto&& initial) -> Value& {
-            return made.emplace(std::forward<decltype(initial)>(initial));
-        });
-        out.swap(*made);
+        // `out` holds a scalar or a string, which is set aside (moved: nothing to allocate) and
+        // put back if the document cannot be made. The document is made in `out`'s place, as
+        // std::optional::emplace makes its value: a Value constructed from a container takes
+        // one allocation, where assigning one to a Value of another alternative takes two (the
+        // variant wraps a temporary of its own first) and a swap one more.
+        ValueVariant aside(std::move(static_cast<ValueVariant&>(out)));
+        out.~Value();
+        try {
+            adopt(document, [&out](auto&& initial) -> Value& {
+                return *::new (static_cast<void*>(&out))
+                    Value(std::forward<decltype(initial)>(initial));
+            });
+        } catch (...) {
+            // Only a container's allocation fails, before `out` is made anew.
+            static_cast<ValueVariant&>(*::new (static_cast<void*>(&out)) Value()) =
+                std::move(aside);
+            throw;
+        }
     }
 
     /// Puts a refusal of the document in `report`, see DocumentRefusal.

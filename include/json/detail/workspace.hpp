@@ -5,7 +5,7 @@
 // small document is read without a single allocation for them.
 
 #include <cstddef>
-#include <functional>
+#include <cstdint>
 #include <memory>
 #include <new>
 #include <type_traits>
@@ -44,13 +44,15 @@ class Workspace {
     }
     /// Gives back a block from allocate(); nothrow.
     void deallocate(void* block, std::size_t bytes) noexcept {
-        auto* const first = static_cast<std::byte*>(block);
-        // std::less orders any two pointers; the built-in < only those into one array.
-        const std::less<const std::byte*> before;
-        if (before(first, storage) || !before(first, storage + WORKSPACE_SIZE)) {
+        // Where the block starts from the storage's start, as addresses: one unsigned
+        // comparison tells a block of the storage from the heap's (pointers themselves may be
+        // compared only within one array).
+        const std::uintptr_t offset =
+            reinterpret_cast<std::uintptr_t>(block) - reinterpret_cast<std::uintptr_t>(storage);
+        if (offset >= WORKSPACE_SIZE) {
             ::operator delete(block); // unsized: not every compiler declares the sized form
-        } else if (first + bytes == storage + used) {
-            used = static_cast<std::size_t>(first - storage);
+        } else if (offset + bytes == used) {
+            used = offset;
         }
     }
 
