@@ -90,11 +90,7 @@ inline bool read_kept_number(std::string_view literal, const ParseOptions& optio
     if (read_short_number(literal, value)) {
         return true; // such numbers never change
     }
-    value = read_number(literal);
-    if (!may_change(literal)) {
-        return true;
-    }
-    const NumberChange change = change_of(literal, value);
+    const NumberChange change = read_number_checked(literal, value);
     const bool allowed =
         change == NumberChange::NONE ||
         (change == NumberChange::INEXACT_INTEGER && options.allow_inexact_integers) ||

@@ -5,15 +5,14 @@
 
 #include <json/text_conversion.hpp>
 
-#include <charconv>
 #include <cmath>
 #include <cstddef>
 #include <cstdint>
+#include <cstring>
 #include <iterator>
 #include <limits>
 #include <stdexcept>
 #include <string>
-#include <system_error>
 
 namespace json::detail {
 
@@ -29,55 +28,81 @@ std::optional<double> scaled_exactly(std::uint64_t digits, long long exponent) n
     return exponent < 0 ? number / power : number * power;
 }
 
-// Besides the short numbers, an integer of up to nineteen digits (below 10^19, so below 2^64)
-// is converted here, from its 64-bit value: that conversion rounds once, to nearest, as the
-// number-text library does. The others go to the library.
-double read_number(std::string_view literal) noexcept {
-    double value = 0.0;
-    if (read_short_number(literal, value)) {
-        return value;
-    }
-    constexpr std::size_t most_integer_digits = 19;
-    const bool negative = literal.front() == '-';
-    const std::string_view digits = literal.substr(negative ? 1 : 0);
-    std::uint64_t integer = 0;
-    if (digits.size() <= most_integer_digits &&
-        std::from_chars(digits.data(), digits.data() + digits.size(), integer).ptr ==
-            digits.data() + digits.size()) {
-        const auto magnitude = static_cast<double>(integer);
-        return negative ? -magnitude : magnitude;
-    }
-    return string_to_double(literal.data());
-}
-
 namespace {
 
-// Where the integer part of a literal ends: at its point, its exponent or its end. A loop of
-// its own: a search for any of three bytes calls memchr for every byte of the literal.
-std::size_t integer_part_end(std::string_view literal) noexcept {
-    std::size_t at = 0;
-    while (at != literal.size() && literal[at] != '.' && literal[at] != 'e' && literal[at] != 'E') {
-        ++at;
-    }
-    return at;
-}
+constexpr std::size_t EXACT_INTEGER_DIGITS = 15; // every integer of up to fifteen digits is exact
+constexpr std::size_t DIGITS_BELOW_2_TO_64 = 19; // every integer of up to nineteen is below 2^64
 
-} // namespace
+// What one look at a literal finds: its integer part (its value, when it has at most nineteen
+// digits) and whether a fraction or an exponent follows it.
+struct Layout {
+    bool negative;
+    std::size_t integer_digits;
+    std::uint64_t integer;
+    bool integer_only; // nothing follows the integer part
+    bool exponent;
+};
 
-bool may_change(std::string_view literal) noexcept {
-    constexpr std::size_t exact_digits = 15; // every integer of up to fifteen digits is exact
-    const std::size_t sign = literal.front() == '-' ? 1 : 0;
-    const std::size_t point_or_exponent = integer_part_end(literal);
-    if (point_or_exponent - sign > exact_digits) {
-        return true; // an integer part beyond the exact integers
+// Whether [from, to), the part of a literal after its integer part (its fraction and then its
+// exponent), has an exponent. Eight bytes at a time: setting bit 0x20 of each makes an 'E' an
+// 'e' and leaves digits, signs and the point as they are; the exclusive or with eight 'e's
+// then leaves a zero byte exactly where an exponent starts.
+bool has_exponent(const char* from, const char* to) noexcept {
+    constexpr std::uint64_t each_byte = 0x0101010101010101U;
+    for (; to - from >= 8; from += 8) {
+        std::uint64_t word = 0;
+        std::memcpy(&word, from, sizeof word);
+        word = (word | 0x20 * each_byte) ^ ('e' * each_byte);
+        if (((word - each_byte) & ~word & 0x80 * each_byte) != 0) {
+            return true;
+        }
     }
-    // Past the integer part come the fraction and then the exponent.
-    for (std::size_t at = point_or_exponent; at != literal.size(); ++at) {
-        if (literal[at] == 'e' || literal[at] == 'E') {
+    for (; from != to; ++from) {
+        if ((*from | 0x20) == 'e') {
             return true;
         }
     }
     return false;
+}
+
+Layout layout_of(std::string_view literal) noexcept {
+    Layout layout{};
+    const char* next = literal.data();
+    const char* const end = next + literal.size();
+    layout.negative = *next == '-';
+    next += layout.negative ? 1 : 0;
+    const char* const first = next;
+    for (; next != end && static_cast<unsigned char>(*next - '0') < 10; ++next) {
+        layout.integer = 10 * layout.integer + static_cast<std::uint64_t>(*next - '0');
+    }
+    layout.integer_digits = static_cast<std::size_t>(next - first);
+    layout.integer_only = next == end;
+    layout.exponent = has_exponent(next, end);
+    return layout;
+}
+
+// An integer of up to nineteen digits (below 10^19, so below 2^64) is converted from its 64-bit
+// value: that conversion rounds once, to nearest, as the number-text library does. Short
+// numbers are read by read_short_number, the others by the library.
+double read_laid_out(std::string_view literal, const Layout& layout) noexcept {
+    if (layout.integer_only && layout.integer_digits <= DIGITS_BELOW_2_TO_64) {
+        const auto magnitude = static_cast<double>(layout.integer);
+        return layout.negative ? -magnitude : magnitude;
+    }
+    double value = 0.0;
+    return read_short_number(literal, value) ? value : string_to_double(literal.data());
+}
+
+} // namespace
+
+double read_number(std::string_view literal) noexcept {
+    double value = 0.0;
+    return read_short_number(literal, value) ? value : read_laid_out(literal, layout_of(literal));
+}
+
+bool may_change(std::string_view literal) noexcept {
+    const Layout layout = layout_of(literal);
+    return layout.integer_digits > EXACT_INTEGER_DIGITS || layout.exponent;
 }
 
 namespace {
@@ -117,27 +142,29 @@ std::string exact_integer_text(double value) {
     return std::signbit(value) ? "-" + digits : digits;
 }
 
-NumberChange change_of(std::string_view literal, double value) {
+NumberChange read_number_checked(std::string_view literal, double& value) {
+    const Layout layout = layout_of(literal);
+    value = read_laid_out(literal, layout);
+    if (layout.integer_digits <= EXACT_INTEGER_DIGITS && !layout.exponent) {
+        return NumberChange::NONE;
+    }
     if (!std::isfinite(value)) {
         return NumberChange::OVERFLOW;
     }
-    constexpr double exact_integers = 9007199254740992.0; // 2^53: every integer below is exact
-    const double magnitude = std::fabs(value);
-    if (magnitude < exact_integers || integer_part_end(literal) != literal.size()) {
+    if (!layout.integer_only) {
         return NumberChange::NONE; // a fraction or an exponent is rounded as asked
     }
-    // JSON integers have no leading zeros: equal values have equal digits. An integer below
-    // 2^64 is compared as one, a longer one with the double's exact decimal digits.
-    const std::string_view digits = literal.substr(literal.front() == '-' ? 1 : 0);
-    constexpr double past_64_bits = 18446744073709551616.0; // 2^64
-    std::uint64_t integer = 0;
-    if (magnitude < past_64_bits &&
-        std::from_chars(digits.data(), digits.data() + digits.size(), integer).ec == std::errc()) {
-        return static_cast<std::uint64_t>(magnitude) == integer ? NumberChange::NONE
-                                                                : NumberChange::INEXACT_INTEGER;
+    // JSON integers have no leading zeros: equal values have equal digits. Below 2^64 a double
+    // that is an integer converts back to one.
+    const double magnitude = std::fabs(value);
+    if (layout.integer_digits <= DIGITS_BELOW_2_TO_64) {
+        return static_cast<std::uint64_t>(magnitude) == layout.integer
+                   ? NumberChange::NONE
+                   : NumberChange::INEXACT_INTEGER;
     }
-    return digits == exact_integer_text(magnitude) ? NumberChange::NONE
-                                                   : NumberChange::INEXACT_INTEGER;
+    return literal.substr(layout.negative ? 1 : 0) == exact_integer_text(magnitude)
+               ? NumberChange::NONE
+               : NumberChange::INEXACT_INTEGER;
 }
 
 namespace {

@@ -78,13 +78,14 @@ enum class NumberChange : unsigned char { NONE, INEXACT_INTEGER, OVERFLOW };
 
 /// Whether reading `literal` can change it as NumberChange says: only a literal with an
 /// exponent, or with sixteen or more digits before its point, can. Linear in its length, one
-/// look for the first point or exponent. Throws nothing.
+/// look at it. Throws nothing.
 bool may_change(std::string_view literal) noexcept;
 
-/// What reading `literal` as `value` (the double read_number gave) changed. Linear in the
-/// length of the literal; an integer from 2^53 up is compared with the double's exact decimal
-/// digits. Throws std::bad_alloc.
-NumberChange change_of(std::string_view literal, double value);
+/// Reads the JSON number `literal` (NUL-terminated) into `value`, the double read_number gives,
+/// and returns what that changed. One look at the literal finds both; an integer of up to
+/// nineteen digits is compared as a 64-bit integer, a longer one with the double's exact
+/// decimal digits. Throws std::bad_alloc.
+NumberChange read_number_checked(std::string_view literal, double& value);
 
 /// The exact decimal digits of a double that is an integer (as every double from 2^53 up is),
 /// with its sign: "1234567890123456768". Throws std::bad_alloc.

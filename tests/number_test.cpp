@@ -86,4 +86,22 @@ TEST(IntegerNumbers, SampledReadAsTheLibraryReads) {
     }
 }
 
+// An exponent that takes a number beyond the range of double is refused wherever it stands in a
+// long literal (the look for it takes eight bytes at a time), in either case; so is a long
+// integer part's, while the same digits without the exponent are read.
+TEST(ExponentNumbers, FoundAtEveryPlace) {
+    for (std::size_t zeros = 0; zeros != 24; ++zeros) {
+        for (const std::string& mantissa :
+             {"1." + std::string(zeros, '0') + "5", "-1" + std::string(zeros, '0') + ".5"}) {
+            Value out;
+            EXPECT_TRUE(parse(mantissa, out, ParseOptions())) << mantissa;
+            for (const char* exponent : {"e400", "E+400"}) {
+                const std::string literal = mantissa + exponent;
+                const ParseReport report = parse(literal, out, ParseOptions());
+                EXPECT_EQ(report.refusal, Refusal::INEXACT_NUMBER) << literal;
+            }
+        }
+    }
+}
+
 } // namespace
