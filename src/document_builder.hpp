@@ -202,7 +202,7 @@ class DocumentBuilder {
     WorkspaceStack<OpenContainer> open_containers;
     std::size_t member_name = 0;     // the index in `texts` of the last member name read
     std::uint64_t member_prefix = 0; // and its name_prefix()
-    // The first capacities, which fill about two thirds of a Workspace (see there).
+    // The first capacities, which fill about three fifths of a Workspace (see there).
     static constexpr std::size_t INITIAL_VALUES = 24;
     static constexpr std::size_t INITIAL_CONTAINERS = 8;
 };
