@@ -87,11 +87,10 @@ inline bool read_kept_number(std::string_view literal, const ParseOptions& optio
     if (options.exact_numbers) {
         return read_number_exactly(literal, value) || refusal.inexact(literal);
     }
-    value = read_number(literal);
-    if (!may_change(literal)) {
-        return true;
+    if (read_short_number(literal, value)) {
+        return true; // such numbers never change
     }
-    const NumberChange change = change_of(literal, value);
+    const NumberChange change = read_number_checked(literal, value);
     const bool allowed =
         change == NumberChange::NONE ||
         (change == NumberChange::INEXACT_INTEGER && options.allow_inexact_integers) ||

@@ -6,7 +6,10 @@
 #include <json/text_conversion.hpp>
 
 #include <cmath>
+#include <cstddef>
 #include <cstdint>
+#include <cstring>
+#include <iterator>
 #include <limits>
 #include <stdexcept>
 #include <string>
@@ -15,65 +18,91 @@ namespace json::detail {
 
 std::optional<double> scaled_exactly(std::uint64_t digits, long long exponent) noexcept {
     constexpr std::uint64_t exact_integers = std::uint64_t{1} << 53U;
-    constexpr long long largest_exact_power = 22;
-    static constexpr double powers_of_ten[largest_exact_power + 1] = {
-        1e0,  1e1,  1e2,  1e3,  1e4,  1e5,  1e6,  1e7,  1e8,  1e9,  1e10, 1e11,
-        1e12, 1e13, 1e14, 1e15, 1e16, 1e17, 1e18, 1e19, 1e20, 1e21, 1e22};
+    constexpr long long largest_exact_power = std::size(EXACT_POWERS_OF_TEN) - 1;
     if (digits > exact_integers || exponent < -largest_exact_power ||
         exponent > largest_exact_power) {
         return std::nullopt;
     }
     const auto number = static_cast<double>(digits);
-    const double power = powers_of_ten[exponent < 0 ? -exponent : exponent];
+    const double power = EXACT_POWERS_OF_TEN[exponent < 0 ? -exponent : exponent];
     return exponent < 0 ? number / power : number * power;
 }
 
-// A literal without an exponent whose digits, the point left out, number at most fifteen is
-// converted here, by scaled_exactly: those digits are below 2^53 and the power of ten at most
-// 10^15. Most numbers in documents (counts, ids, coordinates, prices) take this path; the
-// others go to the number-text library.
-double read_number(std::string_view literal) noexcept {
-    constexpr std::ptrdiff_t most_digits = 15;
-    // A sign, fifteen digits and a point at most: longer literals are not read twice.
-    if (literal.size() > most_digits + 2) {
-        return string_to_double(literal.data());
+namespace {
+
+constexpr std::size_t EXACT_INTEGER_DIGITS = 15; // every integer of up to fifteen digits is exact
+constexpr std::size_t DIGITS_BELOW_2_TO_64 = 19; // every integer of up to nineteen is below 2^64
+
+// What one look at a literal finds: its integer part (its value, when it has at most nineteen
+// digits) and whether a fraction or an exponent follows it.
+struct Layout {
+    bool negative;
+    std::size_t integer_digits;
+    std::uint64_t integer;
+    bool integer_only; // nothing follows the integer part
+    bool exponent;
+};
+
+// Whether [from, to), the part of a literal after its integer part (its fraction and then its
+// exponent), has an exponent. Eight bytes at a time: setting bit 0x20 of each makes an 'E' an
+// 'e' and leaves digits, signs and the point as they are; the exclusive or with eight 'e's
+// then leaves a zero byte exactly where an exponent starts.
+bool has_exponent(const char* from, const char* to) noexcept {
+    constexpr std::uint64_t each_byte = 0x0101010101010101U;
+    for (; to - from >= 8; from += 8) {
+        std::uint64_t word = 0;
+        std::memcpy(&word, from, sizeof word);
+        word = (word | 0x20 * each_byte) ^ ('e' * each_byte);
+        if (((word - each_byte) & ~word & 0x80 * each_byte) != 0) {
+            return true;
+        }
     }
-    const auto is_digit = [](char c) { return c >= '0' && c <= '9'; };
+    for (; from != to; ++from) {
+        if ((*from | 0x20) == 'e') {
+            return true;
+        }
+    }
+    return false;
+}
+
+Layout layout_of(std::string_view literal) noexcept {
+    Layout layout{};
     const char* next = literal.data();
     const char* const end = next + literal.size();
-    const bool negative = *next == '-';
-    next += negative ? 1 : 0;
-    std::uint64_t digits = 0;
-    const auto read_digits = [&] {
-        const char* const first = next;
-        for (; next != end && is_digit(*next); ++next) {
-            digits = 10 * digits + static_cast<std::uint64_t>(*next - '0');
-        }
-        return next - first;
-    };
-    std::ptrdiff_t count = read_digits();
-    std::ptrdiff_t decimals = 0;
-    if (next != end && *next == '.') {
-        ++next;
-        decimals = read_digits();
-        count += decimals;
+    layout.negative = *next == '-';
+    next += layout.negative ? 1 : 0;
+    const char* const first = next;
+    for (; next != end && static_cast<unsigned char>(*next - '0') < 10; ++next) {
+        layout.integer = 10 * layout.integer + static_cast<std::uint64_t>(*next - '0');
     }
-    if (next != end || count > most_digits) {
-        return string_to_double(literal.data()); // an exponent, or too many digits
+    layout.integer_digits = static_cast<std::size_t>(next - first);
+    layout.integer_only = next == end;
+    layout.exponent = has_exponent(next, end);
+    return layout;
+}
+
+// An integer of up to nineteen digits (below 10^19, so below 2^64) is converted from its 64-bit
+// value: that conversion rounds once, to nearest, as the number-text library does. Short
+// numbers are read by read_short_number, the others by the library.
+double read_laid_out(std::string_view literal, const Layout& layout) noexcept {
+    if (layout.integer_only && layout.integer_digits <= DIGITS_BELOW_2_TO_64) {
+        const auto magnitude = static_cast<double>(layout.integer);
+        return layout.negative ? -magnitude : magnitude;
     }
-    const double magnitude = *scaled_exactly(digits, -decimals);
-    return negative ? -magnitude : magnitude;
+    double value = 0.0;
+    return read_short_number(literal, value) ? value : string_to_double(literal.data());
+}
+
+} // namespace
+
+double read_number(std::string_view literal) noexcept {
+    double value = 0.0;
+    return read_short_number(literal, value) ? value : read_laid_out(literal, layout_of(literal));
 }
 
 bool may_change(std::string_view literal) noexcept {
-    constexpr std::size_t exact_digits = 15; // every integer of up to fifteen digits is exact
-    const std::size_t point_or_exponent = literal.find_first_of(".eE");
-    if (point_or_exponent == std::string_view::npos) {
-        return literal.size() > exact_digits; // an integer of sixteen or more characters
-    }
-    const std::size_t sign = literal.front() == '-' ? 1 : 0;
-    return point_or_exponent - sign > exact_digits || // beyond the range without an exponent
-           literal.find_first_of("eE", point_or_exponent) != std::string_view::npos;
+    const Layout layout = layout_of(literal);
+    return layout.integer_digits > EXACT_INTEGER_DIGITS || layout.exponent;
 }
 
 namespace {
@@ -113,19 +142,29 @@ std::string exact_integer_text(double value) {
     return std::signbit(value) ? "-" + digits : digits;
 }
 
-NumberChange change_of(std::string_view literal, double value) {
+NumberChange read_number_checked(std::string_view literal, double& value) {
+    const Layout layout = layout_of(literal);
+    value = read_laid_out(literal, layout);
+    if (layout.integer_digits <= EXACT_INTEGER_DIGITS && !layout.exponent) {
+        return NumberChange::NONE;
+    }
     if (!std::isfinite(value)) {
         return NumberChange::OVERFLOW;
     }
-    constexpr double exact_integers = 9007199254740992.0; // 2^53: every integer below is exact
-    if (std::fabs(value) < exact_integers ||
-        literal.find_first_of(".eE") != std::string_view::npos) {
+    if (!layout.integer_only) {
         return NumberChange::NONE; // a fraction or an exponent is rounded as asked
     }
-    // JSON integers have no leading zeros: equal values have equal digits.
-    const std::string_view digits = literal.substr(literal.front() == '-' ? 1 : 0);
-    return digits == exact_integer_text(std::fabs(value)) ? NumberChange::NONE
-                                                          : NumberChange::INEXACT_INTEGER;
+    // JSON integers have no leading zeros: equal values have equal digits. Below 2^64 a double
+    // that is an integer converts back to one.
+    const double magnitude = std::fabs(value);
+    if (layout.integer_digits <= DIGITS_BELOW_2_TO_64) {
+        return static_cast<std::uint64_t>(magnitude) == layout.integer
+                   ? NumberChange::NONE
+                   : NumberChange::INEXACT_INTEGER;
+    }
+    return literal.substr(layout.negative ? 1 : 0) == exact_integer_text(magnitude)
+               ? NumberChange::NONE
+               : NumberChange::INEXACT_INTEGER;
 }
 
 namespace {

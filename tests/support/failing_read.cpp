@@ -26,7 +26,8 @@ extern "C" __attribute__((visibility("default"))) ssize_t read(int descriptor, v
         errno = EIO;
         return -1;
     }
-    const ssize_t got = real_read(descriptor, into, count < limit - bytes_read ? count : limit - bytes_read);
+    const ssize_t got =
+        real_read(descriptor, into, count < limit - bytes_read ? count : limit - bytes_read);
     bytes_read += got > 0 ? static_cast<std::size_t>(got) : 0;
     return got;
 }

@@ -5,8 +5,11 @@
 // small document is read without a single allocation for them.
 
 #include <cstddef>
-#include <functional>
+#include <cstdint>
+#include <memory>
 #include <new>
+#include <type_traits>
+#include <utility>
 #include <vector>
 
 namespace json::detail {
@@ -41,13 +44,15 @@ class Workspace {
     }
     /// Gives back a block from allocate(); nothrow.
     void deallocate(void* block, std::size_t bytes) noexcept {
-        auto* const first = static_cast<std::byte*>(block);
-        // std::less orders any two pointers; the built-in < only those into one array.
-        const std::less<const std::byte*> before;
-        if (before(first, storage) || !before(first, storage + WORKSPACE_SIZE)) {
+        // Where the block starts from the storage's start, as addresses: one unsigned
+        // comparison tells a block of the storage from the heap's (pointers themselves may be
+        // compared only within one array).
+        const std::uintptr_t offset =
+            reinterpret_cast<std::uintptr_t>(block) - reinterpret_cast<std::uintptr_t>(storage);
+        if (offset >= WORKSPACE_SIZE) {
             ::operator delete(block); // unsized: not every compiler declares the sized form
-        } else if (first + bytes == storage + used) {
-            used = static_cast<std::size_t>(first - storage);
+        } else if (offset + bytes == used) {
+            used = offset;
         }
     }
 
@@ -99,6 +104,78 @@ class WorkspaceAllocator {
 /// A working stack kept in a Workspace.
 template <typename T>
 using WorkspaceVector = std::vector<T, WorkspaceAllocator<T>>;
+
+/// A stack of T kept in a Workspace, which takes its first room when it is made: a few inlined
+/// stores, where an empty WorkspaceVector and its reserve() cost an out-of-line call for every
+/// element type with a constructor of its own (a reader sets up several stacks per parse, and a
+/// small document is read in a few hundred instructions). It grows as std::vector does,
+/// doubling its room and moving its elements, which must not throw when moved.
+template <typename T>
+class WorkspaceStack {
+    static_assert(std::is_nothrow_move_constructible_v<T>);
+
+  public:
+    /// Room for `capacity` elements (at least one); throws std::bad_alloc.
+    WorkspaceStack(Workspace& workspace, std::size_t capacity)
+        : workspace(workspace), first(take(capacity)), last(first), limit(first + capacity) {}
+    WorkspaceStack(const WorkspaceStack&) = delete;
+    WorkspaceStack& operator=(const WorkspaceStack&) = delete;
+    ~WorkspaceStack() {
+        std::destroy(first, last);
+        workspace.deallocate(first, room() * sizeof(T));
+    }
+
+    std::size_t size() const { return static_cast<std::size_t>(last - first); }
+    bool empty() const { return last == first; }
+    T* begin() { return first; }
+    T* end() { return last; }
+    T& operator[](std::size_t at) { return first[at]; }
+    T& back() { return last[-1]; }
+
+    /// Constructs an element on top; returns it. Amortized constant time; throws what T's
+    /// constructor throws and std::bad_alloc, the stack unchanged then.
+    template <typename... Arguments>
+    T& emplace_back(Arguments&&... arguments) {
+        if (last == limit) {
+            grow();
+        }
+        T* const made = ::new (static_cast<void*>(last)) T(std::forward<Arguments>(arguments)...);
+        ++last;
+        return *made;
+    }
+    void pop_back() { std::destroy_at(--last); }
+    /// Drops the elements from `size` on (`size` at most size()).
+    void shrink_to(std::size_t size) {
+        T* const kept = first + size;
+        std::destroy(kept, last);
+        last = kept;
+    }
+
+  private:
+    std::size_t room() const { return static_cast<std::size_t>(limit - first); }
+    T* take(std::size_t count) {
+        if (count > std::size_t(-1) / sizeof(T)) {
+            throw std::bad_array_new_length();
+        }
+        return static_cast<T*>(workspace.allocate(count * sizeof(T), alignof(T)));
+    }
+    [[gnu::noinline]] void grow() {
+        const std::size_t size = this->size();
+        const std::size_t larger = 2 * room();
+        T* const moved = take(larger);
+        std::uninitialized_move(first, last, moved);
+        std::destroy(first, last);
+        workspace.deallocate(first, room() * sizeof(T));
+        first = moved;
+        last = moved + size;
+        limit = moved + larger;
+    }
+
+    Workspace& workspace;
+    T* first;
+    T* last;
+    T* limit;
+};
 
 } // namespace json::detail
 
