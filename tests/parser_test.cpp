@@ -6,13 +6,9 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
-#include <cstdio>
-#include <cstdlib>
 #include <filesystem>
 #include <fstream>
-#include <iterator>
 #include <map>
-#include <random>
 #include <sstream>
 #include <type_traits>
 #include <utility>
@@ -364,113 +360,6 @@ TEST(ParseOptions, DuplicateKeys) {
         {R"({"a":1,"a":2,})", "dt", "@7 #17 duplicate"},
         {"{\"\\u0061\":1,\"a\":2}", "d", "@12 #17 duplicate"},
     });
-}
-
-// The exact-number rule at its edges: 2^53, digit counts, subnormals, overflow, zeros, trailing
-// zeros and exponents.
-TEST(ParseOptions, ExactNumbers) {
-    // Around 2^53, at 15, 16 and 17 digits, trailing zeros and exponents, zeros, the normal
-    // and subnormal limits, overflow, and a coordinate as this writer and another wrote it.
-    const std::string exact =
-        "9007199254740992 9007199254740994 123456789012345 0.123456789012345 0.1234567890123456 "
-        "0.12345678901234566 123456789012345.6 0.1 1.50 1.500000000000000000000000 100e-2 1E2 "
-        "1e+2 1e22 1e23 12345678901234499584 -0 -0.0e5 0e-999999999999 2.2250738585072014e-308 "
-        "2.225073858507201e-308 5e-324 1.7976931348623157e308 -65.61361699999998 0.0078125";
-    const std::string inexact =
-        "9007199254740993 -9007199254740993 0.12345678901234567 1234567890123456.7 "
-        "0.10000000000000001 12345678901234500000 2.2250738585072011e-308 4.9e-324 1e-400 "
-        "1.7976931348623158e308 1e400 -65.613616999999977 0.00390625000000000001";
-    std::istringstream written_back(exact);
-    for (std::string literal; written_back >> literal;) {
-        EXPECT_EQ(outcome(literal, "x"), outcome(literal, "")) << literal;
-    }
-    std::istringstream changed(inexact);
-    for (std::string literal; changed >> literal;) {
-        EXPECT_EQ(outcome(literal, "x"), "@0 #13 inexact") << literal;
-    }
-}
-
-// A number's text as its sign, its significant digits and the power of ten of the first one:
-// two texts denote the same decimal number exactly when these are equal (zero: no digits).
-std::string decimal_value(const std::string& text) {
-    const std::size_t mark = std::min(text.find_first_of("eE"), text.size());
-    std::string digits;
-    long exponent = mark < text.size() ? std::stol(text.substr(mark + 1)) : 0;
-    const std::size_t point = std::min(text.find('.'), mark);
-    for (std::size_t at = 0; at < mark; ++at) {
-        if (std::isdigit(static_cast<unsigned char>(text[at])) != 0 &&
-            (!digits.empty() || text[at] != '0')) {
-            if (digits.empty()) {
-                exponent += static_cast<long>(point) - static_cast<long>(at) - (at < point ? 1 : 0);
-            }
-            digits += text[at];
-        }
-    }
-    digits.erase(digits.find_last_not_of('0') + 1);
-    if (digits.empty()) {
-        return "0";
-    }
-    return (text[0] == '-' ? "-" : "") + digits + "e" + std::to_string(exponent);
-}
-
-// The rule itself on many numbers of ordinary size, written with 15 to 17 digits and with the
-// last digit moved: accepted exactly when the writer's text has the same decimal value.
-TEST(ParseOptions, ExactNumbersAgreeWithTheWriter) {
-    std::mt19937_64 random(2026);
-    std::uniform_real_distribution<double> mantissa(-1.0, 1.0);
-    std::uniform_int_distribution<int> scale(-12, 17);
-    int refused = 0;
-    for (int round = 0; round < 20000; ++round) {
-        const double number = mantissa(random) * std::pow(10.0, scale(random));
-        char text[40];
-        std::snprintf(text, sizeof text, "%.*g", 15 + round % 3, number);
-        std::string literal = text;
-        if (round % 5 == 0 && literal.find('e') == std::string::npos) {
-            char& last = literal.back();
-            last = last == '9' ? '8' : static_cast<char>(last + 1);
-        }
-        Value lenient;
-        ASSERT_TRUE(parse(literal, lenient, options_from("i"))) << literal;
-        const bool exact = decimal_value(serialize(lenient)) == decimal_value(literal);
-        Value strict;
-        EXPECT_EQ(parse(literal, strict, options_from("x")).result == R::SUCCESS, exact)
-            << literal << " is written " << serialize(lenient);
-        refused += exact ? 0 : 1;
-    }
-    EXPECT_GT(refused, 1000); // both outcomes were tried
-    EXPECT_LT(refused, 19000);
-}
-
-// Numbers become the double nearest to them, whether converted directly (short literals, and
-// with exact_numbers digits below 2^53 with a power of ten up to 10^22) or by the number-text
-// library: literals of 1 to 18 digits with the point anywhere, and the edges of the direct
-// paths, against strtod, in both modes.
-TEST(Parser, NumbersBecomeTheNearestDouble) {
-    std::istringstream edges(
-        "-0 -0.0 -0e5 999999999999999 0.999999999999999 9999999999999999 0.000000000000001 "
-        "0.0000000000000001 1.5e3 -2.5E-3 9007199254740993 -9007199254740992e-22 "
-        "9007199254740991e22 123e-23 123e23");
-    std::vector<std::string> literals{std::istream_iterator<std::string>(edges), {}};
-    std::mt19937_64 random(2026);
-    for (std::size_t round = 0; round < 20000; ++round) {
-        const std::string digits = std::to_string(random() | 1ULL << 63).substr(0, 1 + round % 18);
-        const std::size_t point = random() % (digits.size() + 1);
-        literals.push_back((round % 2 == 0 ? "-" : "") +
-                           (point == 0 ? "0" : digits.substr(0, point)) +
-                           (point < digits.size() ? "." + digits.substr(point) : ""));
-    }
-    for (const std::string& literal : literals) {
-        Value number;
-        ASSERT_TRUE(parse(literal, number, options_from("io"))) << literal;
-        const double expected = std::strtod(literal.c_str(), nullptr);
-        Value exact = expected; // kept when exact_numbers refuses the literal
-        parse(literal, exact, options_from("x"));
-        for (const Value& read : {number, exact}) {
-            EXPECT_TRUE(read.as_number() == expected &&
-                        std::signbit(read.as_number()) == std::signbit(expected))
-                << literal;
-        }
-    }
 }
 
 // The parsing test suite: y_ files must parse, n_ files must fail, i_ files may do either.
