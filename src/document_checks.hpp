@@ -26,8 +26,9 @@ class DocumentRefusal {
     /// A number that exact_numbers refuses.
     [[gnu::cold]] bool inexact(std::string_view literal) {
         return refuse(Refusal::INEXACT_NUMBER, ParseResult::INVALID_EXPONENT,
-                      shown(literal) + " cannot be held exactly by a double; without "
-                                       "ParseOptions::exact_numbers it is rounded");
+                      shown(literal) + " cannot be held exactly by a double, and "
+                                       "ParseOptions::exact_numbers refuses every number a "
+                                       "double changes");
     }
     /// A number read as `value` with a change the options do not allow.
     [[gnu::cold]] bool changed(std::string_view literal, double value, NumberChange change) {

@@ -44,7 +44,8 @@ namespace json {
 
 /// The Value that represents `value`; see the top of this header for the types it takes.
 /// Linear in the size of `value`. Throws std::bad_alloc, std::invalid_argument for an enum
-/// value that has no enumerator, and whatever a user's to_json throws; nothing leaks.
+/// value that has no enumerator, std::out_of_range for an integer that a double cannot hold
+/// exactly, and whatever a user's to_json throws; nothing leaks.
 template <typename T>
 Value value_from(const T& value) {
     if constexpr (detail::hooks::has_to_json<T>::value) {

@@ -19,9 +19,11 @@ namespace json {
 /// why. Iterative, linear in the length of the text. The parser's working stacks start in 4 KiB
 /// of the caller's stack, so a small document costs no allocation beyond its own.
 ///
-/// - Numbers become double (alternative 3); a number beyond the range of double becomes plus
-///   or minus infinity, one below it plus or minus zero, and digits beyond a double's
-///   precision are rounded: ParseOptions::exact_numbers refuses all three instead.
+/// - Numbers become double (alternative 3). An integer that a double cannot hold exactly and a
+///   number beyond the range of double are refused (ParseOptions::allow_inexact_integers
+///   rounds the one, allow_overflow makes the other plus or minus infinity); a number below
+///   the range becomes plus or minus zero and a fraction's digits beyond a double's precision
+///   are rounded. ParseOptions::exact_numbers refuses every number a double changes.
 /// - A run of \u escapes is converted as UTF-16, so a surrogate pair becomes one character;
 ///   an unpaired surrogate is refused (or becomes U+FFFD with allow_lone_surrogates). Strings
 ///   and member names must be well-formed UTF-8 (or are kept byte for byte with
