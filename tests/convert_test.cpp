@@ -1,5 +1,6 @@
 // value_from and value_to: standard types both ways, described structs and enums, the user's
 // hooks, and where each failure is reported.
+#include "support/documents.hpp"
 #include "support/errors.hpp"
 
 #include <json/json.hpp>
@@ -127,6 +128,8 @@ TEST(Convert, StandardTypesBothWays) {
     expect_round_trip(std::pair<int, std::string>(1, "one"), R"([1,"one"])");
     expect_round_trip(std::tuple<bool, int, std::vector<int>>(false, 2, {3}), "[false,2,[3]]");
     expect_round_trip(std::vector<std::optional<int>>{1, std::nullopt}, "[1,null]");
+    // A type's own hooks come before any conversion the library has for it.
+    expect_round_trip(std::vector<shop::Point>{{1, 2}, {3, 4}}, R"(["1,2","3,4"])");
     EXPECT_EQ(value_from("literal"), "literal");
     EXPECT_EQ(value_from(std::string_view("view")), "view");
     EXPECT_EQ(value_to<std::optional<int>>(Value()), std::nullopt);
@@ -166,6 +169,8 @@ TEST(Convert, RangeAndKindFailuresNameTheNumber) {
     EXPECT_EQ(
         failure<std::vector<std::vector<int>>>(json::Array{json::Array{}, json::Array{1, "x"}}),
         "invalid: /1/1: expected JSON number, found JSON string");
+    EXPECT_EQ(failure<std::vector<shop::Point>>(json::Array{json::Array{}}),
+              "invalid: /0: expected JSON string, found JSON array");
 }
 
 // Every float the library writes reads back as the same float; doubles from halfway between
@@ -212,17 +217,13 @@ TEST(Convert, DescribedStructsAndEnums) {
         const char* message;
     } broken[] = {
         {"/items/1/price/amount", "20",
-         "invalid: /items/1/price/amount: expected JSON number, "
-         "found JSON string"},
+         "invalid: /items/1/price/amount: expected JSON number, found JSON string"},
         {"/items/0/price/currency", "GBP",
-         "invalid: /items/0/price/currency: unknown "
-         "enumerator \"GBP\""},
+         "invalid: /items/0/price/currency: unknown enumerator \"GBP\""},
         {"/items/0/tags", json::Object{},
-         "invalid: /items/0/tags: expected JSON array, found "
-         "JSON object"},
+         "invalid: /items/0/tags: expected JSON array, found JSON object"},
         {"/notes/gift", json::Array{1},
-         "missing: /notes/gift/1: missing element (expected "
-         "JSON array of 2 elements, found 1)"},
+         "missing: /notes/gift/1: missing element (expected JSON array of 2 elements, found 1)"},
         {"/items/1/name", Value(), "missing: /items/1/name: missing member"},
         // The whole string is the name, not the part before a NUL byte.
         {"/items/0/price/currency", std::string("EUR\0junk", 8),
@@ -236,75 +237,69 @@ TEST(Convert, DescribedStructsAndEnums) {
     EXPECT_THROW(value_from(static_cast<shop::Currency>(7)), std::invalid_argument);
 }
 
-// The JSON text of the Settings that `document` converts to with `options`, or the error.
-std::string settings_or_error(const Value& document, const json::ConvertOptions& options) {
+// The JSON text of the Settings that `document` converts to, or the error; `flags` 1 keeps the
+// defaults of missing members, 2 refuses unknown members.
+std::string settings_or_error(const Value& document, int flags) {
+    json::ConvertOptions options;
+    options.missing_members_keep_defaults = (flags & 1) != 0;
+    options.reject_unknown_members = (flags & 2) != 0;
     std::string text;
     const std::string error = test_support::error_of(
         [&] { text = json::serialize(value_from(value_to<config::Settings>(document, options))); });
     return text.empty() ? error : text;
 }
 
-json::ConvertOptions convert_options(bool keep_defaults, bool reject_unknown) {
-    json::ConvertOptions options;
-    options.missing_members_keep_defaults = keep_defaults;
-    options.reject_unknown_members = reject_unknown;
-    return options;
-}
-
 const char* const UNKNOWN = "unknown member (the struct has no member of this name)";
 
-// Each text under each of the four combinations of the two options.
+// Each text under each of the four combinations of the two options. Refusing unknown members
+// changes nothing where there is none; where there is one, it is refused before any member of
+// its struct is converted, so before a missing member is noticed.
 TEST(Convert, OptionsForConfigStructs) {
-    const std::string unknown = UNKNOWN;
     const struct {
         const char* text;
-        std::string results[4]; // no option, keep defaults, reject unknown, both
+        std::string plain, keeping_defaults; // without refusing unknown members
+        const char* unknown;                 // the unknown member refused, if any
     } rows[] = {
         // A null optional stays null; a missing one is nullopt, or keeps its default.
         {R"({"server":{"host":"a","port":1,"timeout":null},"replicas":[{"host":"b","port":2}],)"
          R"("named":{}})",
-         {R"({"named":{},"replicas":[{"host":"b","port":2,"timeout":null}],)"
-          R"("server":{"host":"a","port":1,"timeout":null}})",
-          R"({"named":{},"replicas":[{"host":"b","port":2,"timeout":30}],)"
-          R"("server":{"host":"a","port":1,"timeout":null}})",
-          R"({"named":{},"replicas":[{"host":"b","port":2,"timeout":null}],)"
-          R"("server":{"host":"a","port":1,"timeout":null}})",
-          R"({"named":{},"replicas":[{"host":"b","port":2,"timeout":30}],)"
-          R"("server":{"host":"a","port":1,"timeout":null}})"}},
+         R"({"named":{},"replicas":[{"host":"b","port":2,"timeout":null}],)"
+         R"("server":{"host":"a","port":1,"timeout":null}})",
+         R"({"named":{},"replicas":[{"host":"b","port":2,"timeout":30}],)"
+         R"("server":{"host":"a","port":1,"timeout":null}})",
+         nullptr},
         // Missing members, inherited ones among them, inside sequences, maps and tuples.
         {R"({"server":{"host":"a","port":2},"replicas":[{"port":3}],"named":{"n":[{},4]}})",
-         {"missing: /replicas/0/host: missing member",
-          R"({"named":{"n":[{"host":"localhost","port":8080,"timeout":30},4]},)"
-          R"("replicas":[{"host":"localhost","port":3,"timeout":30}],)"
-          R"("server":{"host":"a","port":2,"timeout":30}})",
-          "missing: /replicas/0/host: missing member",
-          R"({"named":{"n":[{"host":"localhost","port":8080,"timeout":30},4]},)"
-          R"("replicas":[{"host":"localhost","port":3,"timeout":30}],)"
-          R"("server":{"host":"a","port":2,"timeout":30}})"}},
-        // Unknown members: ignored, or refused where they stand before any member of their
-        // struct is converted; a map's keys are never unknown.
+         "missing: /replicas/0/host: missing member",
+         R"({"named":{"n":[{"host":"localhost","port":8080,"timeout":30},4]},)"
+         R"("replicas":[{"host":"localhost","port":3,"timeout":30}],)"
+         R"("server":{"host":"a","port":2,"timeout":30}})",
+         nullptr},
+        // Unknown members, in nested structs and at the top; a map's keys are never unknown.
         {R"({"server":{"portt":1},"named":{"any":[{},0]}})",
-         {"missing: /server/host: missing member",
-          R"({"named":{"any":[{"host":"localhost","port":8080,"timeout":30},0]},"replicas":[],)"
-          R"("server":{"host":"localhost","port":8080,"timeout":30}})",
-          "invalid: /server/portt: " + unknown, "invalid: /server/portt: " + unknown}},
+         "missing: /server/host: missing member",
+         R"({"named":{"any":[{"host":"localhost","port":8080,"timeout":30},0]},"replicas":[],)"
+         R"("server":{"host":"localhost","port":8080,"timeout":30}})",
+         "/server/portt"},
         {R"({"server":{},"replicas":[{},{"a/b":1}],"extra":true})",
-         {"missing: /server/host: missing member",
-          R"({"named":{},"replicas":[{"host":"localhost","port":8080,"timeout":30},)"
-          R"({"host":"localhost","port":8080,"timeout":30}],)"
-          R"("server":{"host":"localhost","port":8080,"timeout":30}})",
-          "invalid: /extra: " + unknown, "invalid: /extra: " + unknown}},
+         "missing: /server/host: missing member",
+         R"({"named":{},"replicas":[{"host":"localhost","port":8080,"timeout":30},)"
+         R"({"host":"localhost","port":8080,"timeout":30}],)"
+         R"("server":{"host":"localhost","port":8080,"timeout":30}})",
+         "/extra"},
         {R"({"server":{"host":"a","port":"80","a/b":1}})",
-         {"invalid: /server/port: expected JSON number, found JSON string",
-          "invalid: /server/port: expected JSON number, found JSON string",
-          "invalid: /server/a~1b: " + unknown, "invalid: /server/a~1b: " + unknown}},
+         "invalid: /server/port: expected JSON number, found JSON string",
+         "invalid: /server/port: expected JSON number, found JSON string", "/server/a~1b"},
     };
     for (const auto& row : rows) {
-        Value document;
-        ASSERT_TRUE(json::parse(row.text, document, {})) << row.text;
+        const Value document = test_support::parsed(row.text);
         for (int flags = 0; flags < 4; ++flags) {
-            EXPECT_EQ(settings_or_error(document, convert_options(flags & 1, flags & 2)),
-                      row.results[flags])
+            const std::string expected =
+                (flags & 2) != 0 && row.unknown != nullptr
+                    ? "invalid: " + std::string(row.unknown) + ": " + UNKNOWN
+                : (flags & 1) != 0 ? row.keeping_defaults
+                                   : row.plain;
+            EXPECT_EQ(settings_or_error(document, flags), expected)
                 << row.text << " with options " << flags;
         }
     }
@@ -325,13 +320,6 @@ TEST(Convert, OptionsThroughValueOrAndUndefinedMembers) {
     document.at("server").as_object()["ghost"] = 0;
     EXPECT_EQ(test_support::error_of([&] { document.value_or("server", config::Server{}, both); }),
               std::string("invalid: /server/ghost: ") + UNKNOWN);
-}
-
-TEST(Convert, UserHooksComeFirst) {
-    expect_round_trip(std::vector<shop::Point>{{1, 2}, {3, 4}}, R"(["1,2","3,4"])");
-    const Value wrong = json::Array{json::Array{}};
-    EXPECT_EQ(failure<std::vector<shop::Point>>(wrong),
-              "invalid: /0: expected JSON string, found JSON array");
 }
 
 } // namespace
