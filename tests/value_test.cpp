@@ -1,4 +1,6 @@
 // The value model and the builders.
+#include "support/errors.hpp"
+
 #include <json/json.hpp>
 
 #include <gtest/gtest.h>
@@ -54,14 +56,6 @@ TEST(Value, IntegersAreHeldExactlyOrRefused) {
     for (const auto& [value, number] : held) {
         EXPECT_EQ(value, number) << number;
     }
-    const auto refusal = [](const std::function<void()>& make) {
-        try {
-            make();
-        } catch (const std::out_of_range& error) {
-            return std::string(error.what());
-        }
-        return std::string("(nothing thrown)");
-    };
     const std::pair<std::function<void()>, const char*> refused[] = {
         {[] { Value(std::int64_t{1234567890123456789}); },
          "1234567890123456789 cannot be held exactly by a double (the nearest is "
@@ -79,7 +73,8 @@ TEST(Value, IntegersAreHeldExactlyOrRefused) {
          "1234567890123456789 cannot be held"},
     };
     for (const auto& [make, message] : refused) {
-        EXPECT_EQ(refusal(make).rfind(message, 0), 0U) << refusal(make);
+        const std::string error = test_support::error_of(make);
+        EXPECT_EQ(error.rfind("missing: " + std::string(message), 0), 0U) << error;
     }
 }
 
@@ -114,8 +109,11 @@ TEST(Value, CopiesAssignmentAndEquality) {
 
 // Short Arrays of scalars, strings and empty containers are copied in one loop, longer ones and
 // those holding a non-empty container element by element: each length around the limit, each
-// with and without a nested container at its end.
-TEST(Value, CopiesArraysOfEveryLength) {
+// with and without a nested container at its end. Beyond the depth the copy recurses to, the
+// levels are copied from its work list: arrays and objects that each hold a container beside
+// the next level, several at each level, each level swapped in so that nothing but the last
+// check copies the tree.
+TEST(Value, CopiesArraysOfEveryLengthAndNestingOfEveryDepth) {
     const std::vector<Value> all = samples();
     const Value leaves[] = {all[0], all[1], all[2], all[3], all[4], all[5], Array{}, Object{}};
     for (const std::size_t length : {1, 2, 255, 256, 257, 1000}) {
@@ -131,13 +129,6 @@ TEST(Value, CopiesArraysOfEveryLength) {
             EXPECT_EQ(Value(source), source) << length << (nested ? " nested" : "");
         }
     }
-}
-
-// Arrays and objects that each hold a container beside the next level, deeper than the copy
-// recurses: the levels beyond are copied from its work list, several at each level. Each level
-// is swapped in, so that nothing but the last line copies the tree.
-TEST(Value, CopiesNestingBeyondTheRecursion) {
-    const std::vector<Value> all = samples();
     Value deep = all[6];
     for (int level = 0; level < 300; ++level) {
         Value next = level % 2 == 0 ? Value(Array{all[7], Value()})
