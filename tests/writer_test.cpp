@@ -2,6 +2,7 @@
 // refused arguments, failed and unfinished writes, and what reaches a stream when.
 #include "support/documents.hpp"
 #include "support/errors.hpp"
+#include "support/writing.hpp"
 
 #include <json/json.hpp>
 
@@ -54,27 +55,12 @@ TEST(Writer, EventsGiveTheTextOfSerialize) {
         expect_text_of_serialize(
             test_support::parsed(test_support::read_file(path), test_support::options_from("i")));
     }
-}
-
-// Reformatting through the Writer keeps member order, repeated members and literals.
-TEST(Writer, KeepsWhatTheEventsGive) {
+    // Reformatting through the Writer keeps member order, repeated members and literals.
     std::string text;
     Writer writer(text);
     ASSERT_TRUE(
         parse_events(R"({"b": [1.50, 1e400], "a": 1234567890123456789, "b": "\/x"})", writer));
     EXPECT_EQ(text, R"({"b":[1.50,1e400],"a":1234567890123456789,"b":"\/x"})");
-}
-
-// Indentation too long for the stream's buffer to take in one piece goes out in pieces.
-TEST(Writer, LongIndentationOntoAStream) {
-    const Value nested = Array{Array{1}, 2};
-    WriteOptions wide;
-    wide.pretty = true;
-    wide.indent = 9000;
-    std::ostringstream stream;
-    Writer(stream, wide).value(nested);
-    EXPECT_EQ(stream.str(), serialize(nested, wide));
-    EXPECT_EQ(stream.str().size(), 9000 + 18000 + 9000 + 9000 + 12) << "spaces and 12 others";
 }
 
 TEST(Writer, ScalarsAndNumberTexts) {
@@ -210,24 +196,16 @@ TEST(Writer, RefusalsAndWhatTheOptionsLetThrough) {
     EXPECT_EQ(json::validate(text).refusal, json::Refusal::INVALID_UTF8); // as the option warns
 }
 
-// Fails on its first write, when its caller enabled exceptions.
-class FailingBuffer : public std::streambuf {
-  protected:
-    int_type overflow(int_type) override { throw std::runtime_error("disk gone"); }
-    std::streamsize xsputn(const char*, std::streamsize) override {
-        throw std::runtime_error("disk gone");
-    }
-};
-
 // A write that fails part-way leaves the Writer unusable.
 TEST(Writer, FailedWriteLeavesItUnusable) {
-    FailingBuffer failing;
+    test_support::WrittenText failing;
+    failing.broken = true;
     std::ostream out(&failing);
     out.exceptions(std::ios::badbit);
     Writer writer(out);
     writer.begin_array();
     // More than the Writer gathers before it hands text on to its stream.
-    EXPECT_THROW(writer.string(std::string(std::size_t{64} * 1024, 'x')), std::runtime_error);
+    EXPECT_THROW(writer.string(std::string(std::size_t{64} * 1024, 'x')), std::ios::failure);
     EXPECT_THROW(writer.end_array(), std::logic_error);
     EXPECT_THROW(writer.null(), std::logic_error);
 }
@@ -269,38 +247,34 @@ TEST(Writer, AnIncompleteDocumentIsNotHandedOn) {
     EXPECT_TRUE(untouched.good());
 }
 
-// Keeps what it is given and counts flushes.
-class CountingBuffer : public std::stringbuf {
-  public:
-    int syncs = 0;
-
-  protected:
-    int sync() override {
-        ++syncs;
-        return 0;
-    }
-};
-
 // Onto a stream: nothing before the top-level value is complete (the text is gathered in a
 // buffer), no flush per line; flush() hands on what is gathered and flushes the stream.
+// Indentation too long for the stream's buffer to take in one piece goes out in pieces.
 TEST(Writer, OntoAStream) {
-    CountingBuffer buffer;
+    test_support::WrittenText buffer;
     std::ostream out(&buffer);
-    {
-        Writer writer(out, write_options_from("p"));
-        writer.begin_array();
-        writer.string("a");
-        writer.null();
-        EXPECT_EQ(buffer.str(), "");
-        writer.flush();
-        EXPECT_EQ(buffer.str(), "[\n    \"a\",\n    null");
-        EXPECT_EQ(buffer.syncs, 1);
-        writer.end_array();
-        EXPECT_EQ(buffer.str(), "[\n    \"a\",\n    null\n]");
-        EXPECT_EQ(buffer.syncs, 1);
-        writer.flush();
-        EXPECT_EQ(buffer.syncs, 2);
-    }
+    Writer writer(out, write_options_from("p"));
+    writer.begin_array();
+    writer.string("a");
+    writer.null();
+    EXPECT_EQ(buffer.text, "");
+    writer.flush();
+    EXPECT_EQ(buffer.text, "[\n    \"a\",\n    null");
+    EXPECT_EQ(buffer.flushes.size(), 1u);
+    writer.end_array();
+    EXPECT_EQ(buffer.text, "[\n    \"a\",\n    null\n]");
+    EXPECT_EQ(buffer.flushes.size(), 1u);
+    writer.flush();
+    EXPECT_EQ(buffer.flushes.size(), 2u);
+
+    const Value nested = Array{Array{1}, 2};
+    WriteOptions wide;
+    wide.pretty = true;
+    wide.indent = 9000;
+    std::ostringstream stream;
+    Writer(stream, wide).value(nested);
+    EXPECT_EQ(stream.str(), serialize(nested, wide));
+    EXPECT_EQ(stream.str().size(), 9000 + 18000 + 9000 + 9000 + 12) << "spaces and 12 others";
 }
 
 } // namespace
