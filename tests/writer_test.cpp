@@ -18,6 +18,7 @@ namespace {
 
 using namespace json;
 using test_support::write_options_from;
+using namespace std::string_literals;
 
 // The Writer gives serialize's text under several layouts, from the events the parser reads from
 // the document's compact text (not from serialize's own walk): onto a string after what it held,
@@ -93,15 +94,22 @@ TEST(Writer, ScalarsAndNumberTexts) {
 using Events = std::function<void(Writer&)>;
 
 // Plays events by letter: [ ] { } as themselves, k the key "a", n null, t true, s the string
-// "v", 1 the number 1.0, v the Value 1, u an Undefined Value.
+// "v", S a string of 100 bytes, 1 the number 1.0, v the Value 1, u an Undefined Value, f flush().
 void play(Writer& writer, std::string_view events) {
     static const std::map<char, Events> by_letter = {
-        {'[', [](Writer& w) { w.begin_array(); }},     {']', [](Writer& w) { w.end_array(); }},
-        {'{', [](Writer& w) { w.begin_object(); }},    {'}', [](Writer& w) { w.end_object(); }},
-        {'k', [](Writer& w) { w.key("a"); }},          {'n', [](Writer& w) { w.null(); }},
-        {'t', [](Writer& w) { w.boolean(true); }},     {'s', [](Writer& w) { w.string("v"); }},
-        {'1', [](Writer& w) { w.number(1.0); }},       {'v', [](Writer& w) { w.value(1); }},
-        {'u', [](Writer& w) { w.value(Undefined()); }}};
+        {'[', [](Writer& w) { w.begin_array(); }},
+        {']', [](Writer& w) { w.end_array(); }},
+        {'{', [](Writer& w) { w.begin_object(); }},
+        {'}', [](Writer& w) { w.end_object(); }},
+        {'k', [](Writer& w) { w.key("a"); }},
+        {'n', [](Writer& w) { w.null(); }},
+        {'t', [](Writer& w) { w.boolean(true); }},
+        {'s', [](Writer& w) { w.string("v"); }},
+        {'1', [](Writer& w) { w.number(1.0); }},
+        {'v', [](Writer& w) { w.value(1); }},
+        {'u', [](Writer& w) { w.value(Undefined()); }},
+        {'f', [](Writer& w) { w.flush(); }},
+        {'S', [](Writer& w) { w.string(std::string(100, 'x')); }}};
     for (const char event : events) {
         by_letter.at(event)(writer);
     }
@@ -214,29 +222,19 @@ TEST(Writer, FailedWriteLeavesItUnusable) {
 // back to what it held before, however much was written into it; a stream gets nothing more
 // and failbit, without an exception from the destructor.
 TEST(Writer, AnIncompleteDocumentIsNotHandedOn) {
-    const Events truncated = [](Writer& w) { play(w, "[{k"); };
-    const Events long_and_truncated = [](Writer& w) {
-        w.begin_array();
-        for (int i = 0; i < 1000; ++i) {
-            w.string(std::string(100, 'x'));
-        }
-    };
-    const Events flushed_and_truncated = [](Writer& w) {
-        play(w, "[n");
-        w.flush();
-    };
-    for (const Events& events : {truncated, long_and_truncated, flushed_and_truncated}) {
+    // Cut short: at once, after more than the Writer gathers, after a flush.
+    for (const std::string& events : {"[{k"s, "[" + std::string(1000, 'S'), "[nf"s}) {
         std::string text = "before";
         {
             Writer writer(text);
-            events(writer);
+            play(writer, events);
         }
         EXPECT_EQ(text, "before");
         std::ostringstream out;
         out.exceptions(std::ios::failbit);
         {
             Writer writer(out);
-            events(writer);
+            play(writer, events);
         }
         EXPECT_TRUE(out.fail());
         EXPECT_LT(out.str().size(), 100'000u); // what went out when the buffer filled
