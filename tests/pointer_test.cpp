@@ -117,6 +117,8 @@ TEST(Pointer, BuildsPointersThatReadBack) {
     EXPECT_EQ(deep.find(doc, 2), &doc.at("a/b").at(2));
 }
 
+// What at_pointer's messages (above) do not show: a name under an array, and parents that
+// at_pointer never reaches.
 TEST(Pointer, SaysWhyAStepFindsNothing) {
     const Pointer pointer("/name/3/x/-");
     const struct {
@@ -125,18 +127,13 @@ TEST(Pointer, SaysWhyAStepFindsNothing) {
         std::size_t elements;
         const char* why;
     } rows[] = {
-        {0, Kind::OBJECT, 0, "no member \"name\""},
-        {1, Kind::ARRAY, 2, "index 3 out of range for a JSON array of 2 elements"},
         {2, Kind::ARRAY, 5, "\"x\" is no index of a JSON array"},
-        {3, Kind::ARRAY, 5, "\"-\" is no index of a JSON array"},
-        {2, Kind::STRING, 0, "expected JSON object or array, found JSON string"},
         {2, Kind::NULL_VALUE, 0, "expected JSON object or array, found JSON null"},
         {2, Kind::UNDEFINED, 0, "expected JSON object or array, found no value"},
     };
     for (const auto& row : rows) {
         EXPECT_EQ(pointer.why_missing(row.step, row.parent, row.elements), row.why) << row.why;
     }
-    EXPECT_EQ(pointer.why_missing(1, Value(json::Array{1, 2})), rows[1].why);
 }
 
 } // namespace
