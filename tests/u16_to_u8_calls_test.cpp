@@ -40,11 +40,21 @@ TEST(U16ToU8Calls, ConverterIsMadeOnEveryCall) {
     char16_t text[] = {u'a', 0, u'b'};
     EXPECT_EQ(u16_to_u8(text, 3), "converted");
     EXPECT_EQ(u16_to_u8(nullptr, 0), "");
-    EXPECT_THROW(u16_to_u8(nullptr, 2), std::logic_error);
+    for (const int count : {2, -1}) { // a null text is refused as such, whatever the count
+        try {
+            u16_to_u8(nullptr, count);
+            ADD_FAILURE() << "no exception";
+        } catch (const std::length_error&) {
+            ADD_FAILURE() << "the count was checked before the text";
+        } catch (const std::logic_error& error) {
+            EXPECT_STREQ(error.what(), "basic_string::_M_construct null not valid");
+        }
+    }
     EXPECT_THROW(u16_to_u8(text, -5), std::length_error);
     constructor_throws = true;
     EXPECT_THROW(u16_to_u8(text, 1), std::runtime_error);
     const std::string made = "construct UTF-8 true";
-    EXPECT_EQ(calls, (std::vector<std::string>{made, "convert 3 terminated", "destroy", made,
-                                               "destroy", made, "destroy", made, "destroy", made}));
+    EXPECT_EQ(calls,
+              (std::vector<std::string>{made, "convert 3 terminated", "destroy", made, "destroy",
+                                        made, "destroy", made, "destroy", made, "destroy", made}));
 }
