@@ -1,48 +1,24 @@
 // Documents nested far deeper than any call stack could recurse through: copying, assigning,
 // comparing, writing, parsing and destroying them must not recurse once per level.
 #include "support/documents.hpp"
+#include "support/writing.hpp"
 
 #include <json/json.hpp>
 
 #include <gtest/gtest.h>
 
 #include <ostream>
-#include <streambuf>
 
 namespace {
 
 using namespace json;
+using test_support::nested;
 
 constexpr std::size_t DEPTH = 100'000;
-
-// The compact text of `depth` arrays, or objects with the one member "k", nested around the
-// text `innermost`.
-std::string nested(std::size_t depth, bool objects, const std::string& innermost) {
-    std::string text;
-    for (std::size_t level = 0; level < depth; ++level) {
-        text += objects ? R"({"k":)" : "[";
-    }
-    return text + innermost + std::string(depth, objects ? '}' : ']');
-}
 
 Value parsed(const std::string& text) {
     return test_support::parsed(text, ParseOptions{text.size()});
 }
-
-// Counts the flushes and drops the text: the pretty text of such a chain is tens of gigabytes
-// of indentation.
-class FlushCounter : public std::streambuf {
-  public:
-    std::size_t flushes = 0;
-
-  protected:
-    int_type overflow(int_type c) override { return c; }
-    std::streamsize xsputn(const char*, std::streamsize count) override { return count; }
-    int sync() override {
-        ++flushes;
-        return 0;
-    }
-};
 
 TEST(DeepNesting, ArraysAndObjectsHundredThousandDeep) {
     for (const bool objects : {false, true}) {
@@ -60,12 +36,13 @@ TEST(DeepNesting, ArraysAndObjectsHundredThousandDeep) {
         EXPECT_NE(deep, parsed(nested(DEPTH, objects, "[1]")));
 
         // Every container but the innermost puts its child and its closing bracket on new lines.
-        FlushCounter counter;
+        test_support::WrittenText counter;
+        counter.keep_text = false;
         std::ostream out(&counter);
         Serializer serializer;
         serializer.pretty_print(true);
         serializer.write(out, deep);
-        EXPECT_EQ(counter.flushes, 2 * DEPTH);
+        EXPECT_EQ(counter.flushes.size(), 2 * DEPTH);
 
         copy = objects ? boost::get<Object>(copy)["k"] : boost::get<Array>(copy)[0];
         EXPECT_EQ(serialize(copy), nested(DEPTH - 1, objects, "[]"));

@@ -168,21 +168,16 @@ TEST(Diff, RoundTripsOverTheBenchmarkDocumentsWithRandomEdits) {
 // 100000 levels: nothing here recurses once per level.
 TEST(Diff, WorksOnDocumentsOfAnyDepth) {
     constexpr std::size_t depth = 100000;
-    json::ParseOptions deep;
-    deep.max_depth = depth + 1;
-    std::string objects;
-    for (std::size_t i = 0; i < depth; ++i) {
-        objects += R"({"a":)";
-    }
-    const Value arrays_1 = parsed(std::string(depth, '[') + "1" + std::string(depth, ']'), deep);
-    const Value arrays_2 = parsed(std::string(depth, '[') + "2" + std::string(depth, ']'), deep);
-    const Value objects_1 = parsed(objects + "1" + std::string(depth, '}'), deep);
-    const Value objects_2 = parsed(objects + R"({"b":2})" + std::string(depth, '}'), deep);
+    const auto deep = [](bool objects, std::string_view innermost) {
+        return parsed(test_support::nested(depth, objects, innermost),
+                      test_support::options_from("", depth + 1));
+    };
+    const Value arrays_1 = deep(false, "1"), arrays_2 = deep(false, "2");
     const Value patch = json::diff(arrays_1, arrays_2);
     ASSERT_EQ(patch.as_array().size(), 1u);
     EXPECT_EQ(patch.as_array()[0].at("path").as_string().size(), 2 * depth);
     expect_round_trips(arrays_1, arrays_2, "arrays");
-    expect_round_trips(objects_1, objects_2, "objects");
+    expect_round_trips(deep(true, "1"), deep(true, R"({"b":2})"), "objects");
 }
 
 } // namespace

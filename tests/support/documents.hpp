@@ -1,9 +1,9 @@
 #ifndef JSON_TESTS_DOCUMENTS_HPP
 #define JSON_TESTS_DOCUMENTS_HPP
 
-// The documents the tests read and write: parse and write options by letter, texts that must
-// parse, and the files of the parsing test suite and the benchmarks (JSON_TEST_PARSING_DIR,
-// JSON_BENCH_DATA_DIR).
+// The documents the tests read and write: parse and write options by letter, nested texts,
+// texts that must parse, and the files of the parsing test suite and the benchmarks
+// (JSON_TEST_PARSING_DIR, JSON_BENCH_DATA_DIR).
 
 #include <json/json.hpp>
 
@@ -54,6 +54,16 @@ inline json::WriteOptions write_options_from(std::string_view letters) {
     options.reject_non_finite = has('n');
     options.allow_invalid_utf8 = has('u');
     return options;
+}
+
+/// The compact text of `depth` arrays, or objects with the one member "k", nested around the
+/// text `innermost`.
+inline std::string nested(std::size_t depth, bool objects, std::string_view innermost) {
+    std::string text;
+    for (std::size_t level = 0; level < depth; ++level) {
+        text += objects ? R"({"k":)" : "[";
+    }
+    return text.append(innermost).append(depth, objects ? '}' : ']');
 }
 
 /// What `text` parses to; a text that does not parse fails the test.
