@@ -75,7 +75,7 @@ void check(const Row& row,
     }
 }
 
-TEST(Records, Array) {
+TEST(Records, ArraysAndLines) {
     const Row rows[] = {
         {Layout::ARRAY, R"([1, {"a": [2, {}]}, "x\u00e9", null, true, [], 1.5e3])",
          R"(1 {"a":[2,{}]} "xé" null true [] 1500 )"},
@@ -93,14 +93,6 @@ TEST(Records, Array) {
         {Layout::ARRAY, "[{\"a\": 1},\n {\"b\": tru}]", "{\"a\":1} !2@2:8 "},
         {Layout::ARRAY, "[{\"a\": 1} {\"b\": 2}]", "{\"a\":1} !15@1:11 "},
         {Layout::ARRAY, std::string(BOM) + "[1]", "!11@1:1 "},
-    };
-    for (const Row& row : rows) {
-        check(row);
-    }
-}
-
-TEST(Records, Lines) {
-    const Row rows[] = {
         {Layout::LINES, "{\"a\": 1}\n{\"b\": [2]}\n", R"({"a":1} {"b":[2]} )"},
         // Any value, directly after the one before or after whitespace of any kind.
         {Layout::LINES, R"(1 2 {"a":1}{"b":2}[3]"s"true null)",
