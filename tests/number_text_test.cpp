@@ -22,6 +22,7 @@
 #include <string>
 #include <string_view>
 #include <type_traits>
+#include <utility>
 
 namespace {
 
@@ -199,23 +200,19 @@ TYPED_TEST(NumberText, EdgeCases) {
 }
 
 TEST(NumberText, NonFiniteValues) {
-    struct Case {
-        double value;
-        std::string_view text;
-    };
-    for (const Case& item : {Case{std::numeric_limits<double>::infinity(), "1e999"},
-                             Case{-std::numeric_limits<double>::infinity(), "-1e999"},
-                             Case{std::numeric_limits<double>::quiet_NaN(), "0"},
-                             Case{-std::numeric_limits<double>::quiet_NaN(), "0"}}) {
-        std::array<char, 80> written;
-        written.fill('#');
-        EXPECT_EQ(getDoubleValueStr(written.data(), item.value),
-                  static_cast<int>(item.text.size()));
-        EXPECT_EQ(written.data(), item.text);
-        written.fill('#');
-        EXPECT_EQ(getFloatValueStr(written.data(), static_cast<float>(item.value)),
-                  static_cast<int>(item.text.size()));
-        EXPECT_EQ(written.data(), item.text);
+    constexpr double inf = std::numeric_limits<double>::infinity();
+    constexpr double nan = std::numeric_limits<double>::quiet_NaN();
+    const std::pair<double, std::string_view> rows[] = {
+        {inf, "1e999"}, {-inf, "-1e999"}, {nan, "0"}, {-nan, "0"}};
+    for (const auto& [value, text] : rows) {
+        std::array<char, 80> as_double, as_float;
+        as_double.fill('#');
+        as_float.fill('#');
+        EXPECT_EQ(getDoubleValueStr(as_double.data(), value), static_cast<int>(text.size()));
+        EXPECT_EQ(getFloatValueStr(as_float.data(), static_cast<float>(value)),
+                  static_cast<int>(text.size()));
+        EXPECT_EQ(as_double.data(), text);
+        EXPECT_EQ(as_float.data(), text);
     }
 }
 
