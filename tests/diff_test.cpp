@@ -19,26 +19,21 @@ using json::Value;
 
 using test_support::parsed;
 
-// The patch either way turns one into the other.
-void expect_round_trip(const Value& source, const Value& target, const std::string& what) {
+// The patch either way turns one into the other; with `merge`, the merge patch from source to
+// target does it too (target has no member that became null).
+void expect_round_trips(const Value& source, const Value& target, const std::string& what,
+                        bool merge = true) {
     for (const bool forward : {true, false}) {
         const Value& from = forward ? source : target;
         const Value& to = forward ? target : source;
         Value patched = from;
-        const Value patch = json::diff(from, to);
-        const json::PatchReport report = json::apply_patch(patched, patch);
+        const json::PatchReport report = json::apply_patch(patched, json::diff(from, to));
         ASSERT_TRUE(report) << what << ": " << report.message;
         EXPECT_TRUE(patched == to) << what << (forward ? "" : ", backwards");
     }
-}
-
-// The same, and the merge patch from source to target does it too (target has no member
-// that became null).
-void expect_round_trips(const Value& source, const Value& target, const std::string& what) {
-    expect_round_trip(source, target, what);
     Value merged = source;
     json::apply_merge_patch(merged, json::merge_diff(source, target));
-    EXPECT_TRUE(merged == target) << what << ", merge patch";
+    EXPECT_TRUE(!merge || merged == target) << what << ", merge patch";
 }
 
 TEST(Diff, WritesAReadablePatch) {
@@ -72,7 +67,7 @@ TEST(Diff, WritesAReadablePatch) {
         const Value source = parsed(row.source), target = parsed(row.target);
         EXPECT_EQ(json::serialize(json::diff(source, target), plain_slash), row.patch)
             << row.source;
-        expect_round_trip(source, target, row.source);
+        expect_round_trips(source, target, row.source, false);
     }
 }
 
