@@ -12,8 +12,7 @@ namespace {
 
 using namespace json;
 using test_support::allocations_made;
-using test_support::Exhaustion;
-using test_support::for_each_failing_allocation;
+using test_support::for_each_failure_mode;
 
 const char* const LONG = "a string longer than the small-string buffer of std::string";
 
@@ -21,13 +20,6 @@ const char* const LONG = "a string longer than the small-string buffer of std::s
 Value document() {
     return Array{Object{{"name", LONG}, {"list", Array{1, Array{2, Object{{"x", nullptr}}}}}},
                  Object{}, 2.5f};
-}
-
-// Both modes with the same check; returns the number of allocations.
-template <typename Setup, typename Operation, typename Check>
-std::size_t for_each_failure(Setup setup, Operation operation, Check check) {
-    for_each_failing_allocation(setup, operation, check, Exhaustion::EVERY);
-    return for_each_failing_allocation(setup, operation, check, Exhaustion::ONE).allocations;
 }
 
 // First in the file, so that it also sees the library's first use when the tests of the file
@@ -46,13 +38,16 @@ TEST(Allocation, NothingOutlivesTheFirstUse) {
 
 // A container copy allocates only what it keeps: the container, its item storage, and so on.
 TEST(Allocation, FailedCopyLeavesNothingBehind) {
-    const auto copy = [](const Value& source) { Value copy(source); };
-    const auto nothing = [](const auto&) {};
-    EXPECT_EQ(for_each_failure([] { return Value(Array{}); }, copy, nothing), 1u);
-    EXPECT_EQ(for_each_failure([] { return Value(Array{1, 2, 3}); }, copy, nothing), 2u);
-    EXPECT_GT(for_each_failure(document, copy,
-                               [](const Value& source) { EXPECT_EQ(source, document()); }),
-              10u);
+    const auto allocations = [](Value (*setup)(), auto check) {
+        const auto copy = [](const Value& source) { Value copy(source); };
+        return for_each_failure_mode(setup, copy, check).allocations;
+    };
+    const auto nothing = [](const Value&, bool) {};
+    EXPECT_EQ(allocations([] { return Value(Array{}); }, nothing), 1u);
+    EXPECT_EQ(allocations([] { return Value(Array{1, 2, 3}); }, nothing), 2u);
+    EXPECT_GT(
+        allocations(document, [](const Value& source, bool) { EXPECT_EQ(source, document()); }),
+        10u);
 }
 
 // Assigns `source`, or when `element` is not -1 that element of the target, to `target`. On
@@ -61,12 +56,12 @@ TEST(Allocation, FailedCopyLeavesNothingBehind) {
 void expect_failed_assignment(const Value& target, const Value& source, int element) {
     const bool container = source.which() == 5 || source.which() == 6;
     const Value expected = container && target.which() != source.which() ? Value(false) : target;
-    for_each_failure(
+    for_each_failure_mode(
         [&] { return std::make_pair(target, source); },
         [element](std::pair<Value, Value>& state) {
             state.first = element < 0 ? state.second : boost::get<Array>(state.first)[element];
         },
-        [&](const std::pair<Value, Value>& state) {
+        [&](const std::pair<Value, Value>& state, bool) {
             EXPECT_TRUE(container || source.which() == 4) << "assigning a scalar threw";
             EXPECT_EQ(state.first, expected) << serialize(target) << " = " << serialize(source);
         });
@@ -137,21 +132,23 @@ TEST(Allocation, FailedBuilderOperationsLeaveTheDocumentedState) {
     const Value members = before.property, other = before.other;
     const Object& others = boost::get<Object>(other);
     for (const auto& [operation, guarantee] : rows) {
-        for_each_failure(builders, operation, [&, guarantee = guarantee](const Builders& b) {
-            EXPECT_TRUE(Value(b.left) == Value(before.left) &&
-                        Value(b.right) == Value(before.right) && Value(b.other) == other);
-            Object after = boost::get<Object>(Value(b.property));
-            for (auto member = after.begin(); guarantee == SOME && member != after.end();) {
-                const bool fresh = boost::get<Object>(members).count(member->first) == 0;
-                const Value& value = member->second;
-                EXPECT_TRUE(!fresh || member->first != "d") << "all of `other` is in, yet it threw";
-                EXPECT_TRUE(
-                    !fresh || value.which() == 0 || value == false ||
-                    (others.count(member->first) != 0 && value == others.at(member->first)));
-                member = fresh ? after.erase(member) : std::next(member);
-            }
-            EXPECT_EQ(Value(after), members);
-        });
+        for_each_failure_mode(
+            builders, operation, [&, guarantee = guarantee](const Builders& b, bool) {
+                EXPECT_TRUE(Value(b.left) == Value(before.left) &&
+                            Value(b.right) == Value(before.right) && Value(b.other) == other);
+                Object after = boost::get<Object>(Value(b.property));
+                for (auto member = after.begin(); guarantee == SOME && member != after.end();) {
+                    const bool fresh = boost::get<Object>(members).count(member->first) == 0;
+                    const Value& value = member->second;
+                    EXPECT_TRUE(!fresh || member->first != "d")
+                        << "all of `other` is in, yet it threw";
+                    EXPECT_TRUE(
+                        !fresh || value.which() == 0 || value == false ||
+                        (others.count(member->first) != 0 && value == others.at(member->first)));
+                    member = fresh ? after.erase(member) : std::next(member);
+                }
+                EXPECT_EQ(Value(after), members);
+            });
     }
 }
 
@@ -176,20 +173,18 @@ TEST(Allocation, FailedParseLeavesOutAsItWas) {
         R"({"name":"a string long enough to be allocated","list":[1,[2,{"x":null}],"three"]})",
         R"([{"a":1,"a":[2]},"\u00e9\ud83d\ude00",[],{}])",
         R"("just a string that needs an allocation of its own")"};
-    for (const Exhaustion mode : {Exhaustion::ONE, Exhaustion::EVERY}) {
-        for (const char* text : texts) {
-            for (const Value& before :
-                 {Value(), Value(Array{1, LONG}), Value(Object{{"old", Array{}}}), Value(LONG)}) {
-                const auto runs = for_each_failing_allocation(
-                    [&before] { return before; },
-                    [text](Value& out) { static_cast<void>(parse(text, out)); },
-                    [&](const Value& out) {
-                        EXPECT_TRUE(out == before || (mode == Exhaustion::EVERY && out == false))
-                            << text << " into " << serialize(before) << ": " << serialize(out);
-                    },
-                    mode);
-                EXPECT_EQ(runs.absorbed, 0u) << text;
-            }
+    for (const char* text : texts) {
+        for (const Value& before :
+             {Value(), Value(Array{1, LONG}), Value(Object{{"old", Array{}}}), Value(LONG)}) {
+            const auto runs =
+                for_each_failure_mode([&before] { return before; },
+                                      [text](Value& out) { static_cast<void>(parse(text, out)); },
+                                      [&](const Value& out, bool exhausted) {
+                                          EXPECT_TRUE(out == before || (exhausted && out == false))
+                                              << text << " into " << serialize(before) << ": "
+                                              << serialize(out);
+                                      });
+            EXPECT_EQ(runs.absorbed, 0u) << text;
         }
     }
 }

@@ -78,6 +78,21 @@ FailureRuns for_each_failing_allocation(Setup setup, Operation operation, Check 
     }
 }
 
+/// for_each_failing_allocation with one allocation failing at a time, then with memory
+/// exhausted from it on; `check(state, exhausted)` is told which. Returns the first one's runs,
+/// with the runs absorbed in both.
+template <typename Setup, typename Operation, typename Check>
+FailureRuns for_each_failure_mode(Setup setup, Operation operation, Check check) {
+    const auto checked = [&check](bool exhausted) {
+        return [&check, exhausted](auto& state) { check(state, exhausted); };
+    };
+    FailureRuns runs =
+        for_each_failing_allocation(setup, operation, checked(false), Exhaustion::ONE);
+    runs.absorbed +=
+        for_each_failing_allocation(setup, operation, checked(true), Exhaustion::EVERY).absorbed;
+    return runs;
+}
+
 /// Runs `apply(document, patch)` on a copy of `before` once for every allocation it makes,
 /// with that allocation failing, and again with memory exhausted from it on: the document is
 /// left as it was, but for the one case the patch functions name: a top-level array made an
@@ -91,19 +106,14 @@ void expect_patch_undone_when_memory_runs_out(const json::Value& before, const j
     };
     const bool kind_changes =
         before.which() != result.which() && container(before) && container(result);
-    for (const Exhaustion mode : {Exhaustion::ONE, Exhaustion::EVERY}) {
-        for_each_failing_allocation(
-            [&] { return std::make_pair(before, patch); },
-            [&apply](std::pair<json::Value, json::Value>& state) {
-                apply(state.first, state.second);
-            },
-            [&](const std::pair<json::Value, json::Value>& state) {
-                EXPECT_TRUE(state.first == before ||
-                            (kind_changes && mode == Exhaustion::EVERY && state.first == false))
-                    << json::serialize(patch) << " left " << json::serialize(state.first);
-            },
-            mode);
-    }
+    for_each_failure_mode(
+        [&] { return std::make_pair(before, patch); },
+        [&apply](std::pair<json::Value, json::Value>& state) { apply(state.first, state.second); },
+        [&](const std::pair<json::Value, json::Value>& state, bool exhausted) {
+            EXPECT_TRUE(state.first == before ||
+                        (kind_changes && exhausted && state.first == false))
+                << json::serialize(patch) << " left " << json::serialize(state.first);
+        });
 }
 
 } // namespace test_support
