@@ -50,16 +50,14 @@ TEST(DeepNesting, ArraysAndObjectsHundredThousandDeep) {
 }
 
 // Refused by the default depth limit, then parsed, written and released under a raised one.
-TEST(DeepNesting, TextsTenThousandAndAMillionDeep) {
-    for (std::size_t depth : {10'000, 1'000'000}) {
-        for (bool objects : {false, true}) {
-            const std::string text = nested(depth, objects, "1");
-            Value out;
-            const ParseReport refused = parse(text, out, {});
-            EXPECT_EQ(refused.refusal, Refusal::TOO_DEEP);
-            EXPECT_EQ(refused.offset, objects ? 512u * 5 : 512u);
-            EXPECT_EQ(serialize(parsed(text)), text);
-        }
+TEST(DeepNesting, TextsAMillionDeep) {
+    for (bool objects : {false, true}) {
+        const std::string text = nested(1'000'000, objects, "1");
+        Value out;
+        const ParseReport refused = parse(text, out, {});
+        EXPECT_EQ(refused.refusal, Refusal::TOO_DEEP);
+        EXPECT_EQ(refused.offset, objects ? 512u * 5 : 512u);
+        EXPECT_EQ(serialize(parsed(text)), text);
     }
 }
 
