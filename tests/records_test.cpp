@@ -28,11 +28,6 @@ using test_support::WHOLE;
 
 constexpr std::string_view BOM = "\xEF\xBB\xBF";
 
-std::string place_of(const ParseReport& report) {
-    return "!" + std::to_string(static_cast<int>(report.result)) + "@" +
-           std::to_string(report.line) + ":" + std::to_string(report.column) + " ";
-}
-
 // What a reader of `in` gives, read on after every failure until it is at its end: each record
 // written compactly, each failure as "!code@line:column".
 std::string records_of(std::istream& in, Layout layout, const ParseOptions& options) {
@@ -45,8 +40,9 @@ std::string records_of(std::istream& in, Layout layout, const ParseOptions& opti
         }
         if (reader.next(record)) {
             seen += json::serialize(record) + " ";
-        } else if (!reader.report()) {
-            seen += place_of(reader.report());
+        } else if (const ParseReport& report = reader.report(); !report) {
+            seen += "!" + std::to_string(static_cast<int>(report.result)) + "@" +
+                    std::to_string(report.line) + ":" + std::to_string(report.column) + " ";
         }
     }
     return seen;
