@@ -46,7 +46,7 @@ void expect_read_as_strtod(const std::string& literal) {
         if (*letters == '\0' && literal.find_first_of(".eE") == std::string::npos) {
             char digits[400];
             std::snprintf(digits, sizeof digits, "%.0f", expected);
-            EXPECT_EQ(static_cast<bool>(report), literal == digits) << literal;
+            EXPECT_EQ(static_cast<bool>(report), literal.compare(digits) == 0) << literal;
             EXPECT_EQ(report.refusal, report ? Refusal::NONE : Refusal::INEXACT_NUMBER);
         }
     }
