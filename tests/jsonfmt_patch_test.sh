@@ -7,30 +7,14 @@ jsonfmt=$(realpath "$1")
 here=$(cd "$(dirname "$0")" && pwd)
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
-passed=0
-failures=0
-
-pass() { echo "ok   $1"; passed=$((passed + 1)); }
-fail() { echo "FAIL $1"; failures=$((failures + 1)); }
-# check NAME COMMAND...: a case that passes when COMMAND succeeds
-check() {
-    local name=$1
-    shift
-    if "$@"; then pass "$name"; else fail "$name"; fi
-}
+source "$here/support/cases.sh"
 # expect NAME STATUS STDOUT STDERR ARGS...: jsonfmt ARGS (in $work, stdin from $work/stdin) has
 # that status, standard output and standard error
 expect() {
     local name=$1 status=$2 out=$3 err=$4
     shift 4
     (cd "$work" && "$jsonfmt" "$@" <stdin >out 2>err)
-    local got=$?
-    if [ "$got" != "$status" ] || [ "$(cat "$work/out")" != "$out" ] || [ "$(cat "$work/err")" != "$err" ]; then
-        fail "$name: status $got"
-        echo "--- stdout:"; cat "$work/out"; echo "--- stderr:"; cat "$work/err"
-    else
-        pass "$name"
-    fi
+    outcome "$name" "$status" "$out" "$err" $?
 }
 put() { printf '%s' "$2" >"$work/$1"; }
 
@@ -170,5 +154,4 @@ if command -v man >/dev/null; then
     check man-page [ -z "$(man --warnings -l "$here/../tools/jsonfmt.1" 2>&1 >/dev/null)" ]
 fi
 
-echo "$passed passed, $failures failed"
-[ "$failures" -eq 0 ]
+finish

@@ -8,17 +8,7 @@ jsonfmt=$1
 conformance=$2
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
-passed=0
-failures=0
-
-pass() { echo "ok   $1"; passed=$((passed + 1)); }
-fail() { echo "FAIL $1"; failures=$((failures + 1)); }
-# check NAME COMMAND...: a case that passes when COMMAND succeeds
-check() {
-    local name=$1
-    shift
-    if "$@"; then pass "$name"; else fail "$name"; fi
-}
+source "$(dirname "$0")/support/cases.sh"
 # same NAME EXPECTED GOT: the two files hold the same bytes
 same() {
     if cmp -s "$2" "$3"; then
@@ -190,14 +180,7 @@ raw patch 0 '{"a": 1}' 'new\n\n' --patch "$work/add-string.json" -p /n
 raw colors 0 '"a"\n[1]\n' "a\n$(punct '['; number 1; punct ']')\n" -l --color=always
 
 # --check gives the verdict and message of the same run
-for flags in "--raw" "--raw -l" "--raw -p /0" "--raw --lossy" "--color=always" "--color=always -l"; do
-    "$jsonfmt" $flags "$conformance"/* >/dev/null 2>"$work/run.err"
-    run_status=$?
-    "$jsonfmt" --check $flags "$conformance"/* >"$work/check.out" 2>"$work/check.err"
-    check_status=$?
-    check "check-agrees: $flags" bash -c '[ "$0" = "$1" ] && cmp -s "$2" "$3" && [ ! -s "$4" ]' \
-        "$run_status" "$check_status" "$work/run.err" "$work/check.err" "$work/check.out"
-done
+check_agrees "--raw" "--raw -l" "--raw -p /0" "--raw --lossy" "--color=always" "--color=always -l"
 
 # A second value that starts a line of its own is a hint at --lines; one on the same line, or
 # anything but a value, is not (hint NAME INPUT LINE:COLUMN SHOWN CARET HINT ARGS...)
@@ -240,5 +223,4 @@ for option in '--color WHEN:{auto,always,never}' -r,--raw; do
     check "help: $option" grep -qF -- "$option" <("$jsonfmt" --help)
 done
 
-echo "$passed passed, $failures failed"
-[ "$failures" -eq 0 ]
+finish

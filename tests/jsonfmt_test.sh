@@ -16,25 +16,14 @@ feed_in_pieces=$5
 conformance=$6
 here=$(cd "$(dirname "$0")" && pwd)
 source "$here/support/missing.sh"
+source "$here/support/cases.sh"
 work=$(mktemp -d)
 trap 'chmod -R u+w "$work"; rm -rf "$work"' EXIT
 # The read-only directory case runs as another user, who must reach the files.
 chmod 755 "$work"
-passed=0
-failures=0
-
-pass() { echo "ok   $1"; passed=$((passed + 1)); }
-fail() { echo "FAIL $1"; failures=$((failures + 1)); }
 skip() { echo "skip $1"; }
 # absent NAME WHAT: a case that needs WHAT, which only scripts/install-deps.sh installs
 absent() { missing "$1: $2" || failures=$((failures + 1)); }
-# check NAME COMMAND...: a case that passes when COMMAND succeeds
-check() {
-    local name=$1
-    shift
-    if "$@"; then pass "$name"; else fail "$name"; fi
-}
-
 # expect NAME STATUS STDOUT STDERR [PREFIX...] -- ARGS...: runs PREFIX jsonfmt ARGS (stdin from
 # $work/stdin) and compares its status, its standard output and its standard error
 expect() {
@@ -43,13 +32,7 @@ expect() {
     while [ "$1" != -- ]; do prefix+=("$1"); shift; done
     shift
     "${prefix[@]}" "$jsonfmt" "$@" <"$work/stdin" >"$work/out" 2>"$work/err"
-    local got=$?
-    if [ "$got" != "$status" ] || [ "$(cat "$work/out")" != "$out" ] || [ "$(cat "$work/err")" != "$err" ]; then
-        fail "$name: status $got"
-        echo "--- stdout:"; cat "$work/out"; echo "--- stderr:"; cat "$work/err"
-    else
-        pass "$name"
-    fi
+    outcome "$name" "$status" "$out" "$err" $?
 }
 
 # to_full WHAT ARGS...: jsonfmt ARGS writing to a full device must say so and exit 2
@@ -435,15 +418,8 @@ expect non-blocking-pipe-invalid 1 "" "<stdin>:1:7: $(printf '%s' "$no_digit" | 
       ^" "$feed_in_pieces" 200 '[1,2]| x' -- -c
 
 # --check gives every document the verdict of the run it stands for, message for message
-for flags in "" "--ascii --lossy" "--ascii" "--lossy" "--pointer /0" "--sort-keys" "-l" \
-    "--allow-comments --allow-trailing-commas --allow-bom" "--max-depth 2"; do
-    "$jsonfmt" $flags "$conformance"/* >/dev/null 2>"$work/run.err"
-    run_status=$?
-    "$jsonfmt" --check $flags "$conformance"/* >"$work/check.out" 2>"$work/check.err"
-    check_status=$?
-    check "check-agrees: ${flags:-no flags}" bash -c '[ "$0" = "$1" ] && cmp -s "$2" "$3" && [ ! -s "$4" ]' \
-        "$run_status" "$check_status" "$work/run.err" "$work/check.err" "$work/check.out"
-done
+check_agrees "" "--ascii --lossy" "--ascii" "--lossy" "--pointer /0" "--sort-keys" "-l" \
+    "--allow-comments --allow-trailing-commas --allow-bom" "--max-depth 2"
 
 # A byte order mark, lines ended by carriage returns, a depth beyond counting
 printf '\xef\xbb\xbf{"a": 1}' >"$work/bom.json"
@@ -534,5 +510,4 @@ else
     absent man-page "man (Debian package man-db)"
 fi
 
-echo "$passed passed, $failures failed"
-[ "$failures" -eq 0 ]
+finish
