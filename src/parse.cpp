@@ -47,24 +47,29 @@ const char* get_parse_result_description(ParseResult result) {
     return code >= 0 && code < CODE_COUNT ? DESCRIPTIONS[code] : "Unrecognized error code";
 }
 
-ParseReport parse(std::string_view text, Value& out, const ParseOptions& options) {
+namespace {
+
+// Parses `input` (a text or a stream) into `out`, which keeps what it held unless the whole
+// document was read.
+template <typename Input>
+ParseReport parse_into(Input& input, Value& out, const ParseOptions& options) {
     detail::Workspace workspace;
     detail::DocumentBuilder builder(options, workspace);
-    ParseReport report = detail::run_parser(builder, options, workspace, text);
+    ParseReport report = detail::run_parser(builder, options, workspace, input);
     if (report) {
         builder.take(out);
     }
     return report;
 }
 
+} // namespace
+
+ParseReport parse(std::string_view text, Value& out, const ParseOptions& options) {
+    return parse_into(text, out, options);
+}
+
 ParseReport parse(std::istream& in, Value& out, const ParseOptions& options) {
-    detail::Workspace workspace;
-    detail::DocumentBuilder builder(options, workspace);
-    ParseReport report = detail::run_parser(builder, options, workspace, in);
-    if (report) {
-        builder.take(out);
-    }
-    return report;
+    return parse_into(in, out, options);
 }
 
 namespace {
