@@ -26,7 +26,7 @@ class DocumentRefusal {
     /// A number that exact_numbers refuses.
     [[gnu::cold]] bool inexact(std::string_view literal) {
         return refuse(Refusal::INEXACT_NUMBER, ParseResult::INVALID_EXPONENT,
-                      shown(literal) + " cannot be held exactly by a double, and "
+                      shown(literal) + " cannot be held exactly by a double; "
                                        "ParseOptions::exact_numbers refuses every number a "
                                        "double changes");
     }

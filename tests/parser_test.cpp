@@ -246,7 +246,7 @@ TEST(ParseOptions, RefusedUnlessAllowed) {
          "-1e400 is beyond the range of a double: read it as text through json::parse_events, "
          "or allow it as an infinity with ParseOptions::allow_overflow"},
         {"[1234567890123456789]", "x",
-         "1234567890123456789 cannot be held exactly by a double, and "
+         "1234567890123456789 cannot be held exactly by a double; "
          "ParseOptions::exact_numbers refuses every number a double changes"},
         {"[" + std::string(50, '1') + "]", "x", std::string(40, '1') + "... cannot be held"},
         {R"(["x\udc00y"])", "", "\\udc00 is half of a surrogate pair without its other half"},
