@@ -26,6 +26,8 @@ OWN_DOCUMENTS = DOCUMENTS + ["canada_written"]
 
 
 def medians(report):
+    """The median of each benchmark: bytes per second, heap bytes for memory/, and the time of
+    the patch benchmarks (OPERATION/LIBRARY/DOCUMENT), which have no throughput."""
     values = {}
     for run in report["benchmarks"]:
         name = run["run_name"].split("/iterations")[0]
@@ -33,9 +35,29 @@ def medians(report):
             continue
         if name.startswith("memory/"):
             values[name] = run["heap_bytes"]
-        else:
+        elif "bytes_per_second" in run:
             values[name] = run["bytes_per_second"]
+        else:
+            values[name] = run["real_time"]
     return values
+
+
+# The patch benchmarks: jsonvalue's operation, and nlohmann's that do the same job.
+PATCHES = [("patch", "canada", ["patch", "patch_inplace"]), ("diff", "citm_catalog", ["diff"])]
+
+
+def print_patches(values):
+    print("### patches (nlohmann's time over jsonvalue's)")
+    print()
+    print("| operation | document | nlohmann's operation | ratio |")
+    print("|---|---|---|---|")
+    for operation, document, theirs in PATCHES:
+        ours = values.get(f"{operation}/jsonvalue/{document}")
+        for peer_operation in theirs:
+            peer = values.get(f"{peer_operation}/nlohmann/{document}")
+            if ours is not None and peer is not None:
+                print(f"| {operation} | {document} | {peer_operation} | {peer / ours:.2f} |")
+    print()
 
 
 def ratio(values, operation, document, peer):
@@ -88,6 +110,7 @@ def main():
     for title, documents in CLASSES:
         if any(f"parse/{document}/jsonvalue" in values for document in documents):
             print_class(values, title, documents)
+    print_patches(values)
     print("### jsonvalue against itself")
     print()
     print("| document | " + " | ".join(f"{a} / {b}" for a, b in OWN_RATIOS) + " |")
