@@ -105,6 +105,12 @@ TEST(Value, CopiesAssignmentAndEquality) {
     boost::get<Array>(boost::get<Array>(copy)[0])[1] = "changed";
     EXPECT_NE(copy, all[6]);
     EXPECT_EQ(all[6], samples()[6]);
+    // Comparison with what a Value is made from; with namespace json in use, two operands that
+    // are not Values keep their own comparison (else -Wpedantic calls it ambiguous: an error
+    // in the test builds).
+    EXPECT_TRUE(all[6] != 5 && Value(5) == 5 && Value("abc") == std::string("abc"));
+    char same[] = "abc"; // not const: a qualification conversion away from std::string's own
+    EXPECT_TRUE(std::string("abc") == same);
 }
 
 // Short Arrays of scalars, strings and empty containers are copied in one loop, longer ones and

@@ -363,18 +363,25 @@ inline bool operator!=(const Value& left, const Value& right) {
 
 /// Comparison with anything a Value is made from (`v == 5`, `v == "text"`,
 /// `v == json::Array{}`): the right operand is converted to a Value first. Without these,
-/// boost::variant's own comparison templates would make such expressions ill-formed.
-template <typename T,
-          std::enable_if_t<std::is_constructible_v<Value, const T&> && !std::is_same_v<T, Value>,
-                           int> = 0>
-bool operator==(const Value& left, const T& right) {
+/// boost::variant's own comparison templates would make such expressions ill-formed. The left
+/// operand must be a Value itself (deduced, never converted), so that two operands of other
+/// types, such as a std::string and a char array, keep their own comparison where namespace
+/// json is in use.
+template <
+    typename Left, typename T,
+    std::enable_if_t<std::is_same_v<Left, Value> && std::is_constructible_v<Value, const T&> &&
+                         !std::is_same_v<T, Value>,
+                     int> = 0>
+bool operator==(const Left& left, const T& right) {
     return left == Value(right);
 }
 
-template <typename T,
-          std::enable_if_t<std::is_constructible_v<Value, const T&> && !std::is_same_v<T, Value>,
-                           int> = 0>
-bool operator!=(const Value& left, const T& right) {
+template <
+    typename Left, typename T,
+    std::enable_if_t<std::is_same_v<Left, Value> && std::is_constructible_v<Value, const T&> &&
+                         !std::is_same_v<T, Value>,
+                     int> = 0>
+bool operator!=(const Left& left, const T& right) {
     return !(left == Value(right));
 }
 
