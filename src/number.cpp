@@ -81,16 +81,17 @@ Layout layout_of(std::string_view literal) noexcept {
     return layout;
 }
 
-// An integer of up to nineteen digits (below 10^19, so below 2^64) is converted from its 64-bit
-// value: that conversion rounds once, to nearest, as the number-text library does. Short
-// numbers are read by read_short_number, the others by the library.
+// A number read_short_number did not take (read_number tries it first, and so does the parser
+// before read_number_checked; a short number that comes here anyway is read by the library, to
+// the same double). An integer of up to nineteen digits (below 10^19, so below 2^64) is
+// converted from its 64-bit value, which rounds once, to nearest, as the library does; the
+// others by the library.
 double read_laid_out(std::string_view literal, const Layout& layout) noexcept {
     if (layout.integer_only && layout.integer_digits <= DIGITS_BELOW_2_TO_64) {
         const auto magnitude = static_cast<double>(layout.integer);
         return layout.negative ? -magnitude : magnitude;
     }
-    double value = 0.0;
-    return read_short_number(literal, value) ? value : string_to_double(literal.data());
+    return string_to_double(literal.data());
 }
 
 } // namespace

@@ -84,7 +84,8 @@ bool may_change(std::string_view literal) noexcept;
 /// Reads the JSON number `literal` (NUL-terminated) into `value`, the double read_number gives,
 /// and returns what that changed. One look at the literal finds both; an integer of up to
 /// nineteen digits is compared as a 64-bit integer, a longer one with the double's exact
-/// decimal digits. Throws std::bad_alloc.
+/// decimal digits. Meant for a literal read_short_number did not take: it does not try that
+/// path again. Throws std::bad_alloc.
 NumberChange read_number_checked(std::string_view literal, double& value);
 
 /// The exact decimal digits of a double that is an integer (as every double from 2^53 up is),
