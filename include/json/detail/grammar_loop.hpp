@@ -38,9 +38,8 @@ class Grammar {
     /// concatenated JSON): where one is complete, a value may follow.
     Grammar(Handler& handler, const ParseOptions& options, Workspace& workspace,
             bool sequence = false)
-        : handler(handler), options(options), sequence(sequence), open_containers(workspace) {
-        open_containers.reserve(INITIAL_DEPTH);
-    }
+        : handler(handler), options(options), sequence(sequence),
+          open_containers(workspace, INITIAL_DEPTH) {}
 
     /// Not a result: the text given so far ends before the document does, or inside a token.
     static constexpr ParseResult NEED_MORE = static_cast<ParseResult>(-1);
@@ -191,7 +190,7 @@ class Grammar {
     bool at_start = true; // nothing of the text is read yet
     // 1 for an object, 0 for an array, innermost last (bytes: a std::vector<bool> costs a bit
     // operation on every access).
-    WorkspaceVector<unsigned char> open_containers;
+    WorkspaceStack<unsigned char> open_containers;
     static constexpr std::size_t INITIAL_DEPTH = 64;
     std::string failure_note;
     Refusal refused = Refusal::NONE;
@@ -337,7 +336,7 @@ inline ParseResult Grammar<Handler>::open(bool is_object) {
                           " levels; ParseOptions::max_depth sets the limit");
     }
     ++cursor;
-    open_containers.push_back(is_object ? 1 : 0);
+    open_containers.emplace_back(is_object ? 1 : 0);
     expect = is_object ? Expect::FIRST_NAME : Expect::FIRST_ELEMENT;
     return is_object ? tell([this] { return handler.begin_object(); })
                      : tell([this] { return handler.begin_array(); });

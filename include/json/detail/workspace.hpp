@@ -10,7 +10,6 @@
 #include <new>
 #include <type_traits>
 #include <utility>
-#include <vector>
 
 namespace json::detail {
 
@@ -61,55 +60,11 @@ class Workspace {
     std::size_t used = 0; // the bytes of the storage handed out, the last block's end
 };
 
-/// An allocator whose memory comes from a Workspace (for the element types of the working
-/// stacks, none over-aligned).
-template <typename T>
-class WorkspaceAllocator {
-  public:
-    using value_type = T;
-
-    // Implicit, so that a working stack is constructed from its Workspace.
-    WorkspaceAllocator(Workspace& workspace) noexcept // NOLINT(google-explicit-constructor)
-        : workspace(&workspace) {}
-    template <typename U>
-    WorkspaceAllocator(
-        const WorkspaceAllocator<U>& other) noexcept // NOLINT(google-explicit-constructor)
-        : workspace(other.workspace) {}
-
-    T* allocate(std::size_t count) {
-        if (count > std::size_t(-1) / sizeof(T)) {
-            throw std::bad_array_new_length();
-        }
-        return static_cast<T*>(workspace->allocate(count * sizeof(T), alignof(T)));
-    }
-    void deallocate(T* block, std::size_t count) noexcept {
-        workspace->deallocate(block, count * sizeof(T));
-    }
-
-    template <typename U>
-    bool operator==(const WorkspaceAllocator<U>& other) const noexcept {
-        return workspace == other.workspace;
-    }
-    template <typename U>
-    bool operator!=(const WorkspaceAllocator<U>& other) const noexcept {
-        return workspace != other.workspace;
-    }
-
-  private:
-    template <typename U>
-    friend class WorkspaceAllocator;
-    Workspace* workspace;
-};
-
-/// A working stack kept in a Workspace.
-template <typename T>
-using WorkspaceVector = std::vector<T, WorkspaceAllocator<T>>;
-
 /// A stack of T kept in a Workspace, which takes its first room when it is made: a few inlined
-/// stores, where an empty WorkspaceVector and its reserve() cost an out-of-line call for every
-/// element type with a constructor of its own (a reader sets up several stacks per parse, and a
-/// small document is read in a few hundred instructions). It grows as std::vector does,
-/// doubling its room and moving its elements, which must not throw when moved.
+/// stores, where an empty std::vector with an allocator of the Workspace and its reserve() cost an
+/// out-of-line call for every element type with a constructor of its own (a reader sets up several
+/// stacks per parse, and a small document is read in a few hundred instructions). It grows as
+/// std::vector does, doubling its room and moving its elements, which must not throw when moved.
 template <typename T>
 class WorkspaceStack {
     static_assert(std::is_nothrow_move_constructible_v<T>);
